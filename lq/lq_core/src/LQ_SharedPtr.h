@@ -79,7 +79,8 @@ protected:
     void acquire() { counter_->fetch_add(1, std::memory_order_relaxed); }
 
     void release() {
-        if (counter_ && counter_->fetch_sub(1, std::memory_order_acq_rel) == 1) {
+        // the static counter starts at 1 and never reaches 0; the test only tells the compiler so
+        if (counter_ && counter_->fetch_sub(1, std::memory_order_acq_rel) == 1 && counter_ != &staticCounter_) {
             if (pointer_) Deleter()(pointer_);
             delete counter_;
         }

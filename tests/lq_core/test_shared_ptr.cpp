@@ -1,0 +1,286 @@
+#include <gtest/gtest.h>
+
+#include <regex>
+#include <sstream>
+#include <string>
+#include <type_traits>
+
+#include "LQ_History.h"
+#include "LQ_Point.h"
+#include "LQ_SharedPtr.h"
+#include "LQ_Time.h"
+#include "LogCapture.h"
+
+using namespace LQ;
+
+namespace {
+// Counts destructions so a test sees exactly when a holder deletes.
+struct Tracked {
+    static int destroyed;
+    int value = 0;
+    Tracked() = default;
+    explicit Tracked(int v) : value(v) {}
+    virtual ~Tracked() { ++destroyed; }
+};
+int Tracked::destroyed = 0;
+
+struct DerivedTracked : Tracked {
+    static int derivedDestroyed;
+    explicit DerivedTracked(int v) : Tracked(v) {}
+    ~DerivedTracked() override { ++derivedDestroyed; }
+};
+int DerivedTracked::derivedDestroyed = 0;
+
+using TrackedBase = SharedPtrBase<Tracked, DefaultPtrDeleter<Tracked>>;
+
+template <class T>
+std::string printed(const T& value) {
+    std::ostringstream stream;
+    stream << value;
+    return stream.str();
+}
+}  // namespace
+
+TEST(SharedPtr, emptyHoldersCountOnTheStaticCounter) {
+    const int before = TrackedBase::staticCounter_.load();
+    {
+        SharedPtr<Tracked> empty;
+        SharedPtr<Tracked> copy(empty);
+        SharedPtr<Tracked> fromNull(nullptr);
+        EXPECT_FALSE(empty);
+        EXPECT_FALSE(copy);
+        EXPECT_TRUE(fromNull == nullptr);
+        EXPECT_EQ(TrackedBase::staticCounter_.load(), before + 3);
+        EXPECT_FALSE(empty.isOwning());
+    }
+    EXPECT_EQ(TrackedBase::staticCounter_.load(), before);
+    EXPECT_GE(before, 1);
+}
+
+TEST(SharedPtr, ownershipAndRelease) {
+    Tracked::destroyed = 0;
+    {
+        SharedPtr<Tracked> first(new Tracked(1));
+        SharedPtr<Tracked> second(first);
+        EXPECT_EQ(first.useCount(), 2);
+        EXPECT_EQ(second.get(), first.get());
+
+        // the copy keeps the object alive after the first holder moves on
+        first = new Tracked(2);
+        EXPECT_EQ(Tracked::destroyed, 0);
+        EXPECT_EQ(second->value, 1);
+        EXPECT_EQ(first->value, 2);
+
+        // a raw assignment to the only holder destroys what it held
+        second = new Tracked(3);
+        EXPECT_EQ(Tracked::destroyed, 1);
+        EXPECT_EQ((*second).value, 3);
+
+        // assigning null takes ownership of nothing and still releases
+        second = static_cast<Tracked*>(nullptr);
+        EXPECT_EQ(Tracked::destroyed, 2);
+        EXPECT_FALSE(second);
+
+        // a holder assigned to another sharing the same object keeps it alive
+        SharedPtr<Tracked> third(first);
+        first = third;
+        EXPECT_EQ(Tracked::destroyed, 2);
+        EXPECT_EQ(first.useCount(), 2);
+
+        // self-assignment neither deletes nor changes the count
+        SharedPtr<Tracked>& alias = first;
+        first = alias;
+        EXPECT_EQ(Tracked::destroyed, 2);
+        EXPECT_EQ(first.useCount(), 2);
+        EXPECT_EQ(first->value, 2);
+    }
+    EXPECT_EQ(Tracked::destroyed, 3);
+}
+
+TEST(SharedPtr, nonOwningHolderNeverDeletes) {
+    Tracked::destroyed = 0;
+    const int before = TrackedBase::staticCounter_.load();
+    Tracked local(7);
+    {
+        SharedPtr<Tracked> view(&local, false);
+        SharedPtr<Tracked> copy(view);
+        EXPECT_TRUE(view);
+        EXPECT_FALSE(copy.isOwning());
+        EXPECT_EQ(copy->value, 7);
+        EXPECT_EQ(TrackedBase::staticCounter_.load(), before + 2);
+    }
+    EXPECT_EQ(Tracked::destroyed, 0);
+    EXPECT_EQ(TrackedBase::staticCounter_.load(), before);
+    // the owning form of the same constructor does delete
+    { SharedPtr<Tracked> owner(new Tracked(8), true); }
+    EXPECT_EQ(Tracked::destroyed, 1);
+}
+
+TEST(SharedPtr, derivedSharedAsBase) {
+    Tracked::destroyed = 0;
+    DerivedTracked::derivedDestroyed = 0;
+    {
+        SharedPtr<Tracked> base;
+        {
+            SharedPtr<DerivedTracked> derived(new DerivedTracked(5));
+            base = derived;
+            EXPECT_EQ(derived.useCount(), 2);
+            SharedPtr<Tracked> constructed(derived);
+            EXPECT_EQ(derived.useCount(), 3);
+            EXPECT_EQ(constructed->value, 5);
+        }
+        EXPECT_EQ(Tracked::destroyed, 0);
+        EXPECT_EQ(base->value, 5);
+    }
+    // deleted once, through the virtual destructor
+    EXPECT_EQ(DerivedTracked::derivedDestroyed, 1);
+    EXPECT_EQ(Tracked::destroyed, 1);
+
+    // a non-owning derived holder stays non-owning as its base
+    DerivedTracked local(6);
+    {
+        SharedPtr<DerivedTracked> view(&local, false);
+        SharedPtr<Tracked> base(view);
+        EXPECT_FALSE(base.isOwning());
+    }
+    EXPECT_EQ(DerivedTracked::derivedDestroyed, 1);
+}
+
+TEST(SharedPtr, arrayDeletesEveryElement) {
+    Tracked::destroyed = 0;
+    {
+        SharedArray<Tracked> array(new Tracked[3]);
+        SharedArray<Tracked> copy(array);
+        copy[2].value = 9;
+        EXPECT_EQ(array[2].value, 9);
+        array = new Tracked[2];
+        EXPECT_EQ(Tracked::destroyed, 0);
+    }
+    EXPECT_EQ(Tracked::destroyed, 5);
+
+    int buffer[4] = {1, 2, 3, 4};
+    { SharedArray<int> view(buffer, false); EXPECT_EQ(view[3], 4); }
+    EXPECT_EQ(buffer[3], 4);
+}
+
+TEST(SharedPtr, printing) {
+    EXPECT_EQ(printed(SharedPtr<int>(new int(5))), "SharedPtr(5)");
+    EXPECT_EQ(printed(SharedPtr<int>()), "SharedPtr(NULL)");
+    EXPECT_EQ(printed(SharedPtr<PointF>(new PointF(1.5f, 2.f))), "SharedPtr(PointF(1.5, 2))");
+}
+
+TEST(History, ringOfLastValues) {
+    History<int> history;
+    history.init(3);
+    EXPECT_EQ(history.size(), 0u);
+    for (int value = 1; value <= 4; ++value) history.add(value);
+    EXPECT_EQ(history.size(), 3u);
+    EXPECT_EQ(history.element(0), 4);
+    EXPECT_EQ(history.element(1), 3);
+    EXPECT_EQ(history.element(2), 2);
+
+    const FailedCheck outside = catchCheck([&] { history.element(3); });
+    EXPECT_TRUE(outside.thrown);
+    EXPECT_EQ(outside.expression, "number < size()");
+    EXPECT_EQ(outside.tail, "accessing of element out of range : 3 >= 3");
+    EXPECT_EQ(outside.function, "element");
+
+    // the next slot still holds what the previous pass left: the 2 that just fell out
+    int& slot = history.modifyNext();
+    EXPECT_EQ(slot, 2);
+    slot = 5;
+    EXPECT_EQ(history.element(0), 5);
+    EXPECT_EQ(history.element(2), 3);
+    EXPECT_EQ(history.counter(), 5u);
+}
+
+TEST(History, modifyNextFillsTheNextSlot) {
+    History<int> history;
+    history.init(3);
+    history.add(1);
+    history.add(2);
+    int& slot = history.modifyNext();
+    EXPECT_EQ(history.size(), 3u);
+    slot = 30;
+    EXPECT_EQ(&history.element(0), &slot);
+    EXPECT_EQ(history.element(0), 30);
+    EXPECT_EQ(history.element(2), 1);
+}
+
+TEST(History, initKeepsOrDrops) {
+    History<int> history;
+    history.init(5);
+    history.add(1);
+    history.add(2);
+    history.init(5);
+    EXPECT_EQ(history.size(), 2u);
+    EXPECT_EQ(history.element(0), 2);
+    history.init(4);
+    EXPECT_EQ(history.size(), 0u);
+    EXPECT_EQ(history.capacity(), 4u);
+    EXPECT_TRUE(catchCheck([&] { history.element(0); }).thrown);
+
+    // a copy owns its own values
+    history.add(7);
+    History<int> copy(history);
+    history.add(8);
+    EXPECT_EQ(copy.size(), 1u);
+    EXPECT_EQ(copy.element(0), 7);
+}
+
+TEST(History, initNotCalled) {
+    History<float> history;
+    const auto expectInitCheck = [](const FailedCheck& check, const char* function) {
+        EXPECT_TRUE(check.thrown);
+        EXPECT_EQ(check.expression, "data_");
+        EXPECT_EQ(check.tail, "init not called\n");
+        EXPECT_EQ(check.function, function);
+    };
+    expectInitCheck(catchCheck([&] { history.add(1.f); }), "add");
+    expectInitCheck(catchCheck([&] { history.modifyNext(); }), "modifyNext");
+    expectInitCheck(catchCheck([&] { history.element(0); }), "element");
+
+    // freed memory needs init again
+    history.init(2);
+    history.add(1.f);
+    history.free();
+    EXPECT_EQ(history.size(), 0u);
+    expectInitCheck(catchCheck([&] { history.add(1.f); }), "add");
+}
+
+TEST(History, printing) {
+    History<bool> flags;
+    flags.init(4);
+    EXPECT_EQ(printed(flags), "History[0]()");
+    flags.add(true);
+    flags.add(false);
+    EXPECT_EQ(printed(flags), "History[2](0, 1, )");
+}
+
+TEST(Time, clockReadingsAndForms) {
+    const unsigned long before = getTimeNano();
+    const long milliseconds = getTime();
+    const unsigned long after = getTimeNano();
+    EXPECT_GE(milliseconds, static_cast<long>(before / 1000000));
+    EXPECT_LE(milliseconds, static_cast<long>(after / 1000000));
+
+    // the clock can be set back, so a difference must be able to go below zero
+    Timer timer;
+    EXPECT_TRUE(std::is_signed<decltype(timer.getDiff())>::value);
+    EXPECT_TRUE(std::is_signed<decltype(timer.getDiffNano())>::value);
+    EXPECT_GE(timer.getDiffNano(), 0);
+
+    const std::string text = printed(timer);
+    std::smatch match;
+    ASSERT_TRUE(std::regex_match(text, match, std::regex("(-?[0-9]+)ms")));
+    const long shown = std::stol(match[1]);
+    EXPECT_GE(shown, 0);
+    EXPECT_LE(shown, timer.getDiff());
+
+    EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 5000), std::regex("[0-9]{2}:[0-9]{2}:[0-9]{2}\\.000005")));
+    EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 999999999), std::regex(".*\\.999999")));
+    EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 0), std::regex(".*:[0-9]{2}\\.000000")));
+    EXPECT_TRUE(std::regex_match(expandedTime(), std::regex("[0-9]{2}:[0-9]{2}:[0-9]{2}\\.[0-9]{6}")));
+    EXPECT_TRUE(std::regex_match(fullTime(), std::regex("[0-9]{4}_[0-9]{2}_[0-9]{2}__[0-9]{2}_[0-9]{2}_[0-9]{2}")));
+    EXPECT_TRUE(std::regex_match(fullDate(), std::regex("[0-9]{4}_[0-9]{2}_[0-9]{2}")));
+}
