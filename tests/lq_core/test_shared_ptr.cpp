@@ -87,14 +87,15 @@ TEST(SharedPtr, ownershipAndRelease) {
         EXPECT_EQ(Tracked::destroyed, 2);
         EXPECT_EQ(first.useCount(), 2);
 
-        // self-assignment neither deletes nor changes the count
-        SharedPtr<Tracked>& alias = first;
-        first = alias;
+        // self-assignment of the only owner neither deletes nor changes the count
+        SharedPtr<Tracked> sole(new Tracked(4));
+        SharedPtr<Tracked>& alias = sole;
+        sole = alias;
         EXPECT_EQ(Tracked::destroyed, 2);
-        EXPECT_EQ(first.useCount(), 2);
-        EXPECT_EQ(first->value, 2);
+        EXPECT_EQ(sole.useCount(), 1);
+        EXPECT_EQ(sole->value, 4);
     }
-    EXPECT_EQ(Tracked::destroyed, 3);
+    EXPECT_EQ(Tracked::destroyed, 4);
 }
 
 TEST(SharedPtr, nonOwningHolderNeverDeletes) {
@@ -159,7 +160,10 @@ TEST(SharedPtr, arrayDeletesEveryElement) {
     EXPECT_EQ(Tracked::destroyed, 5);
 
     int buffer[4] = {1, 2, 3, 4};
-    { SharedArray<int> view(buffer, false); EXPECT_EQ(view[3], 4); }
+    {
+        SharedArray<int> view(buffer, false);
+        EXPECT_EQ(view[3], 4);
+    }
     EXPECT_EQ(buffer[3], 4);
 }
 
@@ -277,10 +281,12 @@ TEST(Time, clockReadingsAndForms) {
     EXPECT_GE(shown, 0);
     EXPECT_LE(shown, timer.getDiff());
 
-    EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 5000), std::regex("[0-9]{2}:[0-9]{2}:[0-9]{2}\\.000005")));
+    EXPECT_TRUE(
+        std::regex_match(expandedTime(1700000000, 5000), std::regex("[0-9]{2}:[0-9]{2}:[0-9]{2}\\.000005")));
     EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 999999999), std::regex(".*\\.999999")));
     EXPECT_TRUE(std::regex_match(expandedTime(1700000000, 0), std::regex(".*:[0-9]{2}\\.000000")));
     EXPECT_TRUE(std::regex_match(expandedTime(), std::regex("[0-9]{2}:[0-9]{2}:[0-9]{2}\\.[0-9]{6}")));
-    EXPECT_TRUE(std::regex_match(fullTime(), std::regex("[0-9]{4}_[0-9]{2}_[0-9]{2}__[0-9]{2}_[0-9]{2}_[0-9]{2}")));
+    EXPECT_TRUE(
+        std::regex_match(fullTime(), std::regex("[0-9]{4}_[0-9]{2}_[0-9]{2}__[0-9]{2}_[0-9]{2}_[0-9]{2}")));
     EXPECT_TRUE(std::regex_match(fullDate(), std::regex("[0-9]{4}_[0-9]{2}_[0-9]{2}")));
 }

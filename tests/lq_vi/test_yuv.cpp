@@ -142,3 +142,30 @@ TEST(Yuv420toBgr, WholeFramesOfOddSizesStayInsideTheirBuffers) {
         }
     }
 }
+
+#if defined(LQ_HAVE_SSSE3)
+TEST(Yuv420toBgr, HostVectorRowsEqualScalarRows) {
+    if (!LQ::haveSsse3()) GTEST_SKIP() << "this processor has no SSSE3";
+    std::mt19937 random(13);
+    for (int width = 1; width <= 67; ++width) {
+        std::vector<unsigned char> luma(2 * width), chroma(2 * width);
+        for (auto& b : luma) b = static_cast<unsigned char>(random());
+        for (auto& b : chroma) b = static_cast<unsigned char>(random());
+        if (width > 3) {
+            luma[0] = 255, chroma[0] = 255, chroma[1] = 255;
+            luma[2] = 0, chroma[2] = 0, chroma[3] = 0;
+        }
+        for (bool swap : {false, true}) {
+            std::vector<unsigned char> scalar(3 * width, 1), vector(3 * width, 2);
+            LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
+            LQ::yuvRowZoomSse(luma.data(), chroma.data(), vector.data(), width, swap);
+            EXPECT_EQ(scalar, vector) << "SSSE3, width " << width << " swap " << swap;
+            if (LQ::haveAvx2()) {
+                std::vector<unsigned char> wide(3 * width, 3);
+                LQ::yuvRowZoomAvx2(luma.data(), chroma.data(), wide.data(), width, swap);
+                EXPECT_EQ(scalar, wide) << "AVX2, width " << width << " swap " << swap;
+            }
+        }
+    }
+}
+#endif

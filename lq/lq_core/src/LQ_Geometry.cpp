@@ -13,14 +13,20 @@ namespace {
 constexpr float DETERMINANT_EPSILON = 1e-5f;
 
 // A rotated coordinate that should be an integer may come out just below it.
-int truncateStable(float value) { return static_cast<int>(value * stableMultiplier<float>()); }
+int truncateStable(float value) {
+    return static_cast<int>(value * stableMultiplier<float>());
+}
 
-float clampUnit(float value) { return std::min(1.f, std::max(-1.f, value)); }
+float clampUnit(float value) {
+    return std::min(1.f, std::max(-1.f, value));
+}
 }  // namespace
 
 // ---- plane ------------------------------------------------------------------
 
-float getLength(const BasePoint<float>& v) { return std::sqrt(v.dot(v)); }
+float getLength(const BasePoint<float>& v) {
+    return std::sqrt(v.dot(v));
+}
 
 BasePoint<float> getNormalized(const BasePoint<float>& v) {
     const float length = getLength(v);
@@ -61,7 +67,9 @@ bool makeCircleThrough3Points(const BasePoint<float>& a, const BasePoint<float>&
     return true;
 }
 
-BasePoint<float> getOrthogonal(const BasePoint<float>& v) { return BasePoint<float>(-v.y, v.x); }
+BasePoint<float> getOrthogonal(const BasePoint<float>& v) {
+    return BasePoint<float>(-v.y, v.x);
+}
 
 float getPositionPointOnSegment(const BasePoint<float>& point, const BasePoint<float>& a,
                                 const BasePoint<float>& b) {
@@ -95,19 +103,19 @@ BasePoint<int> rotate(const BasePoint<int>& v, float angle) {
 
 BaseRect<int> rotateRect(const BaseRect<int>& rect, float angle) {
     const BasePoint<int> centre((rect.left + rect.right) / 2, (rect.top + rect.bottom) / 2);
-    const BasePoint<int> corners[4] = {{rect.left, rect.top},
-                                       {rect.right, rect.top},
-                                       {rect.right, rect.bottom},
-                                       {rect.left, rect.bottom}};
+    const BasePoint<int> corners[4] = {
+        {rect.left, rect.top}, {rect.right, rect.top}, {rect.right, rect.bottom}, {rect.left, rect.bottom}};
     float minX = FLT_MAX, minY = FLT_MAX, maxX = -FLT_MAX, maxY = -FLT_MAX;
     for (const BasePoint<int>& corner : corners) {
-        const BasePoint<float> p = BasePoint<float>(centre) + rotate(BasePoint<float>(corner - centre), angle);
+        const BasePoint<float> p =
+            BasePoint<float>(centre) + rotate(BasePoint<float>(corner - centre), angle);
         minX = std::min(minX, p.x);
         minY = std::min(minY, p.y);
         maxX = std::max(maxX, p.x);
         maxY = std::max(maxY, p.y);
     }
-    return BaseRect<int>(truncateStable(minX), truncateStable(minY), truncateStable(maxX), truncateStable(maxY));
+    return BaseRect<int>(truncateStable(minX), truncateStable(minY), truncateStable(maxX),
+                         truncateStable(maxY));
 }
 
 namespace {
@@ -119,11 +127,17 @@ float signedArea(const BasePoint<float>* points, size_t count) {
 }
 }  // namespace
 
-float getTriangleArea(const BasePoint<float>* points) { return signedArea(points, 3); }
+float getTriangleArea(const BasePoint<float>* points) {
+    return signedArea(points, 3);
+}
 
-float getQuadArea(const BasePoint<float>* points) { return signedArea(points, 4); }
+float getQuadArea(const BasePoint<float>* points) {
+    return signedArea(points, 4);
+}
 
-float getPolylineArea(const std::vector<BasePoint<float>>& points) { return signedArea(points.data(), points.size()); }
+float getPolylineArea(const std::vector<BasePoint<float>>& points) {
+    return signedArea(points.data(), points.size());
+}
 
 float getSignedDistanceToLine(const BasePoint<float>& point, const BasePoint<float>& linePoint,
                               const BasePoint<float>& direction) {
@@ -165,7 +179,9 @@ bool isShapeConvex(const std::vector<BasePoint<float>>& vertices, float toleranc
 
 // ---- space ------------------------------------------------------------------
 
-float getLength(const BasePoint3d<float>& v) { return std::sqrt(v.dot(v)); }
+float getLength(const BasePoint3d<float>& v) {
+    return std::sqrt(v.dot(v));
+}
 
 BasePoint3d<float> getNormalized(const BasePoint3d<float>& v) {
     const float length = getLength(v);
@@ -228,7 +244,8 @@ bool intersectLinePlane(const BasePoint3d<float>& linePoint, const BasePoint3d<f
     return true;
 }
 
-BasePoint3d<float> selectNearestPointInDirection(const BasePoint3d<float>& first, const BasePoint3d<float>& second,
+BasePoint3d<float> selectNearestPointInDirection(const BasePoint3d<float>& first,
+                                                 const BasePoint3d<float>& second,
                                                  const BasePoint3d<float>& direction) {
     return first.dot(direction) < second.dot(direction) ? first : second;
 }

@@ -101,7 +101,8 @@ bool intersectLinePlane(const BasePoint3d<float>& linePoint, const BasePoint3d<f
                         BasePoint3d<float>& intersection);
 
 // Of two points the one with the smaller dot product with direction; the second on a tie.
-BasePoint3d<float> selectNearestPointInDirection(const BasePoint3d<float>& first, const BasePoint3d<float>& second,
+BasePoint3d<float> selectNearestPointInDirection(const BasePoint3d<float>& first,
+                                                 const BasePoint3d<float>& second,
                                                  const BasePoint3d<float>& direction);
 
 // ---- device orientation -----------------------------------------------------

@@ -10,3 +10,9 @@
 #include <arm_neon.h>
 #endif
 #endif
+
+// x86 hosts get their own vectors for the hottest kernels, chosen at run time.
+#if defined(__x86_64__) || defined(__i386__)
+#define LQ_HAVE_SSSE3 1
+#include <immintrin.h>
+#endif

@@ -56,6 +56,7 @@ std::istream& readEnum(std::istream& stream, T& value) {
     }
     LQ_FAIL("cannot parse enum " << EnumNames<T>::typeName() << " from `" << token << "`. Use one of "
                                  << enumValues<T>());
+    return stream;
 }
 
 }  // namespace LQ

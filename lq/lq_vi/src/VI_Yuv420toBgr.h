@@ -3,6 +3,7 @@
 // interleaved V, U pairs) into the BGR working image.
 
 #include "LQ_Image.h"
+#include "LQ_Neon.h"
 
 namespace LQ {
 
@@ -41,6 +42,16 @@ void yuvRowZoomNeon(const unsigned char* luma, const unsigned char* chroma, unsi
                     bool swapRedBlue);
 void yuvRowFullNeon(const unsigned char* luma, const unsigned char* chroma, unsigned char* bgr, int width,
                     bool swapRedBlue);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// x86 hosts, where emulated NEON is slow; needs SSSE3 (haveSsse3()).
+void yuvRowZoomSse(const unsigned char* luma, const unsigned char* chroma, unsigned char* bgr, int width,
+                   bool swapRedBlue);
+bool haveSsse3();
+// the same with AVX2 (haveAvx2()), 32 pixels at a time
+void yuvRowZoomAvx2(const unsigned char* luma, const unsigned char* chroma, unsigned char* bgr, int width,
+                    bool swapRedBlue);
+bool haveAvx2();
 #endif
 
 }  // namespace LQ
