@@ -91,7 +91,7 @@ void ArchiveI::load(std::vector<T, A>* values) {
     if constexpr (std::is_arithmetic<T>::value && !std::is_same<T, bool>::value) {
         if (count) stream_.read(reinterpret_cast<char*>(values->data()), std::streamsize(count) * sizeof(T));
     } else {
-        for (auto& value : *values) *this & value;
+        for (auto& value : *values) *this& value;
     }
 }
 
@@ -108,13 +108,13 @@ std::istream& readString(std::istream& stream, const std::string& str);
 
 // The fixed pieces of text forms such as "Size(w, h)". A macro so that the failed check
 // shows which piece was expected.
-#define LQ_READ_LABEL(stream, label)                                                                 \
-    do {                                                                                             \
-        static_assert(sizeof(label) <= 256, "label too long");                                      \
-        char buffer[256] = {};                                                                       \
-        (stream).read(buffer, sizeof(label) - 1);                                                    \
-        LQ_ASSERT_MSG((std::string(label) == buffer) && (std::istream&)(stream),                     \
-                      "cannot parse `" << (label) << "` from `" << buffer << "`");                   \
+#define LQ_READ_LABEL(stream, label)                                               \
+    do {                                                                           \
+        static_assert(sizeof(label) <= 256, "label too long");                     \
+        char buffer[256] = {};                                                     \
+        (stream).read(buffer, sizeof(label) - 1);                                  \
+        LQ_ASSERT_MSG((std::string(label) == buffer) && (std::istream&)(stream),   \
+                      "cannot parse `" << (label) << "` from `" << buffer << "`"); \
     } while (0)
 
 // Geometry values: their fields in order, each in its own encoding.

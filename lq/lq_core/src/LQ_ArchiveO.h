@@ -36,7 +36,8 @@ public:
     ArchiveO& operator&(const std::vector<T, A>& values);
 
     ArchiveO& write(const float* data, unsigned int count) {
-        stream_.write(reinterpret_cast<const char*>(data), static_cast<std::streamsize>(count) * sizeof(float));
+        stream_.write(reinterpret_cast<const char*>(data),
+                      static_cast<std::streamsize>(count) * sizeof(float));
         return *this;
     }
     ArchiveO& write(const char* data, unsigned int count) {
@@ -63,9 +64,10 @@ ArchiveO& ArchiveO::operator&(const std::vector<T, A>& values) {
     *this & count;
     if constexpr (std::is_arithmetic<T>::value && !std::is_same<T, bool>::value) {
         // same bytes as element by element, in one call
-        if (count) stream_.write(reinterpret_cast<const char*>(values.data()), std::streamsize(count) * sizeof(T));
+        if (count)
+            stream_.write(reinterpret_cast<const char*>(values.data()), std::streamsize(count) * sizeof(T));
     } else {
-        for (const auto& value : values) *this & value;
+        for (const auto& value : values) *this& value;
     }
     return *this;
 }

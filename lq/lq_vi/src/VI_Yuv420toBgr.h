@@ -34,7 +34,7 @@ inline void computeBgr(int y, int u, int v, unsigned char*& destination, bool sw
 // Zoomed: output pixel x takes luma[2x] and the pair chroma[2x], chroma[2x + 1].
 void yuvRowZoomScalar(const unsigned char* luma, const unsigned char* chroma, unsigned char* bgr, int width,
                       bool swapRedBlue);
-// Full size: output pixel x takes luma[x] and the pair of column x / 2.
+// Full size: output pixel x takes luma[x] and the pair of column x / 2; width >= 2.
 void yuvRowFullScalar(const unsigned char* luma, const unsigned char* chroma, unsigned char* bgr, int width,
                       bool swapRedBlue);
 #if defined(LQ_HAVE_NEON)

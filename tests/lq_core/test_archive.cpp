@@ -1,0 +1,381 @@
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "LQ_ArchiveI.h"
+#include "LQ_ArchiveO.h"
+#include "LQ_ImageArchive.h"
+#include "LogCapture.h"
+
+using namespace LQ;
+
+namespace {
+const char* const LITERAL_EXPRESSION = "(std::string(value) == buffer) && (std::istream&)(stream_)";
+
+template <class T>
+std::string bytesOf(const T& value) {
+    std::ostringstream stream;
+    ArchiveO archive(stream);
+    archive & value;
+    return stream.str();
+}
+
+template <class T>
+T readBack(const std::string& bytes, const std::string& version = "") {
+    std::istringstream stream(bytes);
+    ArchiveI archive(stream);
+    archive.setVersion(version);
+    T value{};
+    archive & value;
+    return value;
+}
+
+struct Record {
+    std::string name;
+    int value = 0;
+};
+ArchiveI& operator&(ArchiveI& archive, Record& record) {
+    return archive & record.name & "\n" & record.value;
+}
+}  // namespace
+
+TEST(ArchiveRoundTrip, everyEncodingComesBackInOrder) {
+    std::stringstream stream;
+    ArchiveO out(stream);
+    const std::vector<std::string> names = {"palm", "fist"};
+    const std::vector<float> weights = {0.5f, -1e-20f, 3.25f};
+    const std::vector<Size> sizes = {Size(3, 4), Size(640, 360)};
+    out & true & 'x' & static_cast<signed char>(-5) & static_cast<short>(-300) & -123456 & 0xDEADBEEFu &
+        2.5f & 1.0 / 3 & COLOR_MODE_BGR & std::string("hello world") & "\n" & std::vector<int>{1, -2, 3} &
+        names & weights & sizes & Size(7, 9) & PointF(1.5f, -2) & Point3dF(1, 2, 3) & Rect(1, 2, 3, 4) &
+        RangeF(-1, 1) & std::vector<int>();
+
+    ArchiveI in(stream);
+    bool b = false;
+    char c = 0;
+    signed char sc = 0;
+    short s = 0;
+    int i = 0;
+    unsigned int u = 0;
+    float f = 0;
+    double d = 0;
+    ColorMode mode = COLOR_MODE_UNDEFINED;
+    std::string text;
+    std::vector<int> ints, empty = {42};
+    std::vector<std::string> names2;
+    std::vector<float> weights2;
+    std::vector<Size> sizes2;
+    Size size;
+    PointF point;
+    Point3dF point3d;
+    Rect rect;
+    RangeF range;
+    in & b & c & sc & s & i & u & f & d & mode & text & "\n" &
+        ints & names2 & weights2 & sizes2 & size & point & point3d & rect & range & empty;
+
+    EXPECT_TRUE(b);
+    EXPECT_EQ(c, 'x');
+    EXPECT_EQ(sc, -5);
+    EXPECT_EQ(s, -300);
+    EXPECT_EQ(i, -123456);
+    EXPECT_EQ(u, 0xDEADBEEFu);
+    EXPECT_EQ(f, 2.5f);
+    EXPECT_EQ(d, 1.0 / 3);
+    EXPECT_EQ(mode, COLOR_MODE_BGR);
+    EXPECT_EQ(text, "hello world");
+    EXPECT_EQ(ints, (std::vector<int>{1, -2, 3}));
+    EXPECT_EQ(names2, names);
+    EXPECT_EQ(weights2, weights);
+    EXPECT_EQ(sizes2, sizes);
+    EXPECT_EQ(size, Size(7, 9));
+    EXPECT_EQ(point, PointF(1.5f, -2));
+    EXPECT_EQ(point3d, Point3dF(1, 2, 3));
+    EXPECT_EQ(rect, Rect(1, 2, 3, 4));
+    EXPECT_EQ(range, RangeF(-1, 1));
+    EXPECT_TRUE(empty.empty());
+    EXPECT_TRUE(stream.good());
+    EXPECT_EQ(stream.peek(), std::char_traits<char>::eof());
+
+    // a stored byte other than 0 and 1 still reads as a proper bool
+    EXPECT_TRUE(readBack<bool>(std::string(1, '\x07')));
+}
+
+TEST(ArchiveLayout, memoryImagesWithoutGapsOrLengths) {
+    using namespace std::string_literals;
+    EXPECT_EQ(bytesOf(0x01020304), "\x04\x03\x02\x01"s);
+    EXPECT_EQ(bytesOf(1.0f), "\x00\x00\x80\x3f"s);
+    EXPECT_EQ(bytesOf(true), "\x01"s);
+    EXPECT_EQ(bytesOf(COLOR_MODE_RGBA), "\x09\x00\x00\x00"s);
+    EXPECT_EQ(bytesOf(std::vector<int>{7, -1}), "\x02\x00\x00\x00\x07\x00\x00\x00\xff\xff\xff\xff"s);
+    EXPECT_EQ(bytesOf(Size(3, 5)), "\x03\x00\x00\x00\x05\x00\x00\x00"s);
+    EXPECT_EQ(bytesOf(std::string("ab")), "ab\0"s);
+    EXPECT_EQ(bytesOf(std::string()), "\0"s);
+    EXPECT_EQ(bytesOf("\n"), "\n"s);
+    EXPECT_EQ(bytesOf(std::vector<std::string>{"a", ""}),
+              "\x02\x00\x00\x00"
+              "a\0\0"s);
+
+    std::ostringstream stream;
+    ArchiveO archive(stream);
+    archive.write("xyz", 2).write(std::vector<float>{2.0f}.data(), 1);
+    EXPECT_EQ(stream.str(), "xy\x00\x00\x00\x40"s);
+}
+
+TEST(ArchiveLiteral, marksAreVerifiedAndRefusedWithTheirText) {
+    std::istringstream good("\nVersion");
+    ArchiveI archive(good);
+    EXPECT_NO_THROW(archive & "\n" & "Version");
+
+    struct Case {
+        std::string input;
+        const char* mark;
+        const char* tail;
+    };
+    const Case cases[] = {
+        {"x", "\n", "cannot read \"\n\" from \"x"},
+        {"", "\n", "cannot read \"\n\" from \""},                    // missing at the end
+        {"Vers", "Version", "cannot read \"Version\" from \"Vers"},  // cut short
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.input);
+        const FailedCheck check = catchCheck([&] {
+            std::istringstream stream(c.input);
+            ArchiveI in(stream);
+            in & c.mark;
+        });
+        EXPECT_TRUE(check.thrown);
+        EXPECT_EQ(check.expression, LITERAL_EXPRESSION);
+        EXPECT_EQ(check.tail, c.tail);
+        EXPECT_EQ(check.function, "operator&");
+    }
+
+    const std::string longest(255, 'm'), tooLong(256, 'm');
+    std::istringstream marks(bytesOf(longest.c_str()));
+    ArchiveI in(marks);
+    EXPECT_NO_THROW(in & longest.c_str());
+    const FailedCheck check = catchCheck([&] {
+        std::istringstream stream(bytesOf(tooLong.c_str()));
+        ArchiveI archive(stream);
+        archive & tooLong.c_str();
+    });
+    EXPECT_EQ(check.expression, "size < MAX_BUFFER_SIZE");
+    EXPECT_EQ(check.tail, "wrong str size 256 >= 256");
+
+    const FailedCheck failedStream = catchCheck([] {
+        std::istringstream stream;
+        stream.setstate(std::ios::failbit);
+        ArchiveI archive(stream);
+    });
+    EXPECT_TRUE(failedStream.thrown);
+    EXPECT_EQ(failedStream.expression, "stream_");
+    EXPECT_EQ(failedStream.tail, "empty stream");
+}
+
+TEST(ArchiveString, lengthLimitEmptyStringAndNulInside) {
+    for (const size_t length : {998u, 999u}) {
+        const std::string text(length, 'q');
+        EXPECT_EQ(readBack<std::string>(bytesOf(text)), text);
+    }
+    const FailedCheck check = catchCheck([] { readBack<std::string>(bytesOf(std::string(1000, 'q'))); });
+    EXPECT_TRUE(check.thrown);
+    EXPECT_EQ(check.expression, "buffer[MAX_BUFFER_SIZE - 1] == 0");
+    EXPECT_EQ(check.tail, "too large string");
+
+    // an empty string reads as empty but fails the stream, so the next value is lost
+    std::stringstream stream;
+    ArchiveO out(stream);
+    out & std::string() & 5;
+    ArchiveI in(stream);
+    std::string text = "before";
+    int next = 0;
+    in & text & next;
+    EXPECT_EQ(text, "");
+    EXPECT_TRUE(stream.fail());
+    EXPECT_NE(next, 5);
+
+    // the writer stops at a NUL inside, so the fields behind stay readable
+    std::stringstream withNul;
+    ArchiveO out2(withNul);
+    out2 & std::string("ab\0cd", 5) & 9;
+    ArchiveI in2(withNul);
+    in2 & text & next;
+    EXPECT_EQ(text, "ab");
+    EXPECT_EQ(next, 9);
+}
+
+TEST(ArchiveVersion, orderingAndFieldsFromVersion) {
+    EXPECT_TRUE(isVersionBefore("Version 2", "Version 8"));
+    EXPECT_FALSE(isVersionBefore("Version 8", "Version 2"));
+    EXPECT_FALSE(isVersionBefore("Version 8", "Version 8"));
+    EXPECT_TRUE(isVersionBefore("", "Version 2"));
+    EXPECT_FALSE(isVersionBefore("", ""));
+    EXPECT_TRUE(isVersionBefore("Version", "Version 2"));  // a prefix comes first
+    EXPECT_TRUE(isVersionBefore("Version 10", "Version 2"));
+
+    std::ostringstream written;
+    ArchiveO out(written);
+    EXPECT_EQ(out.getVersion(), "");
+    out.archiveFromVersion("Version 2", 1);  // empty version: before everything, skipped
+    out.setVersion("Version 8");
+    EXPECT_EQ(out.getVersion(), "Version 8");
+    out.archiveFromVersion("Version 7", 2)
+        .archiveFromVersion("Version 8", 3)
+        .archiveFromVersion("Version 9", 4);
+    EXPECT_EQ(written.str(), bytesOf(2) + bytesOf(3));
+
+    struct Case {
+        const char* version;
+        int expected;
+    };
+    for (const Case& c : {Case{"Version 7", 11}, Case{"Version 6", -1}, Case{"", -1}}) {
+        SCOPED_TRACE(c.version);
+        std::istringstream stream(bytesOf(11));
+        ArchiveI in(stream);
+        in.setVersion(c.version);
+        int field = -1;
+        in.archiveFromVersion("Version 7", field);
+        EXPECT_EQ(field, c.expected);
+    }
+}
+
+TEST(ArchiveVector, textualCountBeforeVersion6) {
+    const std::string elements = bytesOf(7) + bytesOf(8) + bytesOf(9);
+    EXPECT_EQ(readBack<std::vector<int>>(" 3" + elements, "Version 5"), (std::vector<int>{7, 8, 9}));
+    EXPECT_EQ(readBack<std::vector<int>>("\n12" + std::string(12 * 4, '\x01'), "Version 2").size(), 12u);
+    EXPECT_EQ(readBack<std::vector<Size>>("1" + bytesOf(Size(4, 5)), "Version 5"),
+              (std::vector<Size>{Size(4, 5)}));
+    // from "Version 6", and with no version at all, the count is raw
+    for (const char* version : {"Version 6", "Version 8", ""}) {
+        SCOPED_TRACE(version);
+        EXPECT_EQ(readBack<std::vector<int>>(bytesOf(3u) + elements, version), (std::vector<int>{7, 8, 9}));
+    }
+    // the writer always writes the raw count
+    std::ostringstream stream;
+    ArchiveO out(stream);
+    out.setVersion("Version 5");
+    out & std::vector<int>{7, 8, 9};
+    EXPECT_EQ(stream.str(), bytesOf(3u) + elements);
+}
+
+TEST(ArchiveFile, loadReadsAnObjectAndRefusesAMissingFile) {
+    const std::string fileName = ::testing::TempDir() + "tactus_archive_record.bin";
+    {
+        std::ofstream file(fileName, std::ios::binary);
+        ArchiveO out(file);
+        out & std::string("thumb") & "\n" & 55000;
+    }
+    Record record;
+    ArchiveI::load(fileName, record);
+    EXPECT_EQ(record.name, "thumb");
+    EXPECT_EQ(record.value, 55000);
+    std::remove(fileName.c_str());
+
+    const std::string missing = ::testing::TempDir() + "tactus_no_such_dir/none.nn";
+    const FailedCheck check = catchCheck([&] { ArchiveI::load(missing, record); });
+    EXPECT_TRUE(check.thrown);
+    EXPECT_EQ(check.expression, "file");
+    EXPECT_EQ(check.tail, "cannot open " + missing);
+}
+
+TEST(ArchiveImage, roundTripWritesRowsWithoutPadding) {
+    Image color(Size(5, 3), COLOR_MODE_BGR);
+    for (int y = 0; y < 3; ++y)
+        for (int x = 0; x < 15; ++x) color.row(y)[x] = static_cast<unsigned char>(y * 40 + x);
+    const std::string bytes = bytesOf(color);
+    EXPECT_EQ(bytes.size(), 8u + 4u + 5 * 3 * 3);
+    EXPECT_EQ(bytes.substr(0, 12), bytesOf(Size(5, 3)) + bytesOf(COLOR_MODE_BGR));
+    const Image colorBack = readBack<Image>(bytes);
+    EXPECT_EQ(colorBack.size(), Size(5, 3));
+    EXPECT_EQ(colorBack.colorMode(), COLOR_MODE_BGR);
+    EXPECT_TRUE(colorBack == color);
+
+    // a reference into a wider image: its rows are 10 bytes apart, only 4 of each are its own
+    Image big(Size(10, 6), COLOR_MODE_MONO);
+    for (int y = 0; y < 6; ++y)
+        for (int x = 0; x < 10; ++x) big.row(y)[x] = static_cast<unsigned char>(10 * y + x);
+    Image part;
+    part.createRef(big, Rect(2, 1, 6, 4));
+    ASSERT_EQ(part.stripLength(), 10u);
+    const std::string partBytes = bytesOf(part);
+    ASSERT_EQ(partBytes.size(), 12u + 4 * 3);
+    std::string expectedPixels;
+    for (int y = 1; y < 4; ++y)
+        for (int x = 2; x < 6; ++x) expectedPixels += static_cast<char>(10 * y + x);
+    EXPECT_EQ(partBytes.substr(12), expectedPixels);
+
+    // reading replaces whatever the target held
+    std::istringstream stream(partBytes);
+    ArchiveI in(stream);
+    Image target(Size(2, 2), COLOR_MODE_FLOAT);
+    in & target;
+    EXPECT_EQ(target.size(), Size(4, 3));
+    EXPECT_EQ(target.colorMode(), COLOR_MODE_MONO);
+    EXPECT_TRUE(target == part);
+
+    EXPECT_FALSE(readBack<Image>(bytesOf(Image())).isCreated());
+    Image floats(Size(3, 1), COLOR_MODE_FLOAT);
+    for (int x = 0; x < 3; ++x) floats.row<float>(0)[x] = 0.25f * x - 1;
+    EXPECT_TRUE(readBack<Image>(bytesOf(floats)) == floats);
+}
+
+TEST(SizeParse, readsItsPrintFormAndNamesTheBadPiece) {
+    std::stringstream printed;
+    printed << Size(640, -360) << Size(0, 7);
+    Size first, second;
+    printed >> first >> second;
+    EXPECT_EQ(first, Size(640, -360));
+    EXPECT_EQ(second, Size(0, 7));
+
+    struct Case {
+        const char* text;
+        const char* expression;
+        const char* tail;
+    };
+    const Case cases[] = {
+        {"Size[1, 2)", "(std::string(\"Size(\") == buffer) && (std::istream&)(stream)",
+         "cannot parse `Size(` from `Size[`"},
+        {"Size(1; 2)", "(std::string(\", \") == buffer) && (std::istream&)(stream)",
+         "cannot parse `, ` from `; `"},
+        {"Size(a, 2)", "(std::string(\", \") == buffer) && (std::istream&)(stream)",  // failed number
+         "cannot parse `, ` from ``"},
+        {"Size(1, 2", "(std::string(\")\") == buffer) && (std::istream&)(stream)",
+         "cannot parse `)` from ``"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.text);
+        const FailedCheck check = catchCheck([&] {
+            std::istringstream stream(c.text);
+            Size size;
+            stream >> size;
+        });
+        EXPECT_TRUE(check.thrown);
+        EXPECT_EQ(check.expression, c.expression);
+        EXPECT_EQ(check.tail, c.tail);
+    }
+
+    // the plain-stream form for fixed headers of text files
+    std::istringstream header("Ring 3");
+    EXPECT_NO_THROW(readString(header, "Ring "));
+    EXPECT_EQ(header.get(), '3');
+    FailedCheck check = catchCheck([] {
+        std::istringstream stream("abx");
+        readString(stream, "abc");
+    });
+    EXPECT_EQ(check.expression, "str == buffer && stream");
+    EXPECT_EQ(check.tail, "cannot read \"abc\" from \"abx");
+    check = catchCheck([] {
+        std::istringstream stream("ab");
+        readString(stream, "abc");
+    });
+    EXPECT_EQ(check.tail, "cannot read \"abc\" from \"ab");
+    check = catchCheck([] {
+        std::istringstream stream(std::string(300, 'a'));
+        readString(stream, std::string(256, 'a'));
+    });
+    EXPECT_EQ(check.expression, "str.size() < MAX_BUFFER_SIZE");
+    EXPECT_EQ(check.tail, "wrong str size 256 >= 256");
+}
