@@ -27,6 +27,20 @@ std::vector<unsigned char> pixelBytes(const LQ::Image& image, int x, int y) {
 
 using Bytes = std::vector<unsigned char>;
 
+// Random luma and chroma for one zoomed row, in exact-size buffers so that a read past
+// the row shows under the sanitizer, with the saturated corners of the colour space.
+struct RowPair {
+    std::vector<unsigned char> luma, chroma;
+    RowPair(int width, std::mt19937& random) : luma(2 * width), chroma(2 * width) {
+        for (auto& b : luma) b = static_cast<unsigned char>(random());
+        for (auto& b : chroma) b = static_cast<unsigned char>(random());
+        if (width > 3) {
+            luma[0] = 255, chroma[0] = 255, chroma[1] = 255;
+            luma[2] = 0, chroma[2] = 0, chroma[3] = 0;
+        }
+    }
+};
+
 }  // namespace
 
 TEST(Yuv420toBgr, HandComputedPixelsWhenZooming) {
@@ -81,17 +95,10 @@ TEST(Yuv420toBgr, OutputSizeAndTinyPictures) {
 #if defined(LQ_HAVE_NEON)
 TEST(Yuv420toBgr, VectorRowsEqualScalarRows) {
     std::mt19937 random(7);
-    std::uniform_int_distribution<int> byte(0, 255);
     for (int width = 1; width <= 67; ++width) {
-        // exact-size buffers, so a read past the row shows under the sanitizer
-        std::vector<unsigned char> luma(2 * width), chroma(2 * width);
-        for (auto& b : luma) b = static_cast<unsigned char>(byte(random));
-        for (auto& b : chroma) b = static_cast<unsigned char>(byte(random));
-        // saturated corners of the colour space
-        if (width > 3) {
-            luma[0] = 255, chroma[0] = 255, chroma[1] = 255;
-            luma[2] = 0, chroma[2] = 0, chroma[3] = 0;
-        }
+        const RowPair row(width, random);
+        const std::vector<unsigned char>& luma = row.luma;
+        const std::vector<unsigned char>& chroma = row.chroma;
         for (bool swap : {false, true}) {
             std::vector<unsigned char> scalar(3 * width, 1), vector(3 * width, 2);
             LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
@@ -149,13 +156,9 @@ TEST(Yuv420toBgr, HostVectorRowsEqualScalarRows) {
     if (!LQ::haveSsse3()) GTEST_SKIP() << "this processor has no SSSE3";
     std::mt19937 random(13);
     for (int width = 1; width <= 67; ++width) {
-        std::vector<unsigned char> luma(2 * width), chroma(2 * width);
-        for (auto& b : luma) b = static_cast<unsigned char>(random());
-        for (auto& b : chroma) b = static_cast<unsigned char>(random());
-        if (width > 3) {
-            luma[0] = 255, chroma[0] = 255, chroma[1] = 255;
-            luma[2] = 0, chroma[2] = 0, chroma[3] = 0;
-        }
+        const RowPair row(width, random);
+        const std::vector<unsigned char>& luma = row.luma;
+        const std::vector<unsigned char>& chroma = row.chroma;
         for (bool swap : {false, true}) {
             std::vector<unsigned char> scalar(3 * width, 1), vector(3 * width, 2);
             LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
