@@ -1,0 +1,22 @@
+#pragma once
+// Gradient operators over mono images: Sobel, Roberts cross, direction sectors, Canny.
+
+#include "LQ_Image.h"
+
+namespace LQ {
+
+// COLOR_MODE_GRADIENT with Gx / 8 and Gy / 8 as signed bytes; borders 0
+void SobelGradient(const Image& source, Image& target);
+void SobelGradientInRect(const Image& source, Image& target, const BaseRect<int>& rect);
+void computeSobelGradient(const Image& source, Image& target);
+// undivided sums as 16-bit two's complement, one COLOR_MODE_MONO16 image per direction
+void computeSobelGradient(const Image& source, Image& first, Image& second);
+void SobelAbsolute(const Image& source, Image& target);
+void robertCross(const Image& source, Image& target);
+// byte 0 the direction sector 0 to 3, byte 1 the magnitude
+void computeGradients(const Image& source, Image& target);
+void thinGradients(Image& image);
+void updateGradients(unsigned char* pixel, int low, int stripLength);
+void canny(const Image& source, Image& target, int minThreshold, int maxThreshold);
+
+}  // namespace LQ

@@ -1,0 +1,31 @@
+#pragma once
+// Integral images: sums of any rectangle by four look-ups, of pixels or of gradient
+// magnitudes per orientation bin.
+
+#include "LQ_Image.h"
+
+namespace LQ {
+
+// (W + 1) x (H + 1) sums of the whole image's size; inside rect the sums of rect alone.
+void computeIntegral(const Image& image, Image& integral, const BaseRect<int>& rect);
+void computeIntegral(const Image& image, Image& integral);
+// whole image, compact rows only
+void computeIntegralOptimized(const Image& image, Image& integral);
+// inclusive sums without the zero border, compact rows
+void integral_image(const unsigned char* source, unsigned int* target, unsigned int width, unsigned int height);
+// the rectangle of the image an integral image was made of
+inline BaseRect<int> integralRect(const Image& integral) {
+    return BaseRect<int>(0, 0, integral.width() - 1, integral.height() - 1);
+}
+
+// Integral HOG of rect, in rect's own coordinates; mode picks 6 unsigned or 12 signed bins.
+void computeIntegralHog(const Image& image, Image& target, const BaseRect<int>& rect, ColorMode mode);
+void computeIntegralHog(const unsigned char* data, int stripLength, Image& target, const BaseRect<int>& rect,
+                        ColorMode mode);
+
+// 512 x 512 tables addressed [a + 256][b + 256], built at first use
+const unsigned char* getMagnitudes();
+const unsigned char* getHogUnsigned6();
+const unsigned char* getHogSigned12();
+
+}  // namespace LQ
