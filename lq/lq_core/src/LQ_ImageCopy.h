@@ -16,6 +16,6 @@ void copyImage(const Image& source, Image& target, const BaseRect<int>& rect, co
 void copyImageBorder(const Image& source, Image& target, const BaseRect<int>& rect);
 
 void splitChannels(const Image& source, std::vector<Image>& channels);
-void mergeChannels(const std::vector<Image>& channels, Image& target, ColorMode mode);
+void mergeChannels(const std::vector<Image>& images, Image& target, ColorMode targetColorMode);
 
 }  // namespace LQ
