@@ -7,7 +7,7 @@
 #include <random>
 #include <vector>
 
-#include "VI_Yuv420toBgr.h"
+#include "LQ_Yuv420toBgr.h"
 
 #if defined(TACTUS_WITH_LIBYUV)
 #include <libyuv.h>

@@ -126,8 +126,8 @@ private:
 // Shared by the kernels so that their failed checks read alike.
 
 #define LQ_ASSERT_CREATED(image) LQ_ASSERT_MSG((image).isCreated(), "image is not created")
-#define LQ_ASSERT_COLOR_MODE(image, mode)                                                     \
-    LQ_ASSERT_MSG((image).colorMode() == (mode), "have " << (image).colorMode() << ", but need " << (mode))
-#define LQ_ASSERT_SIZE(image, size)                                                           \
-    LQ_ASSERT_MSG((image).size() == (size), "have " << (image).size() << ", but need " << (size))
+#define LQ_ASSERT_COLOR_MODE(image, wanted)                                                   \
+    LQ_ASSERT_MSG((image).colorMode() == (wanted), "have " << (image).colorMode() << ", but need " << (wanted))
+#define LQ_ASSERT_SIZE(image, wanted)                                                         \
+    LQ_ASSERT_MSG((image).size() == (wanted), "have " << (image).size() << ", but need " << (wanted))
 #define LQ_ASSERT_CONTAINS(outer, inner) LQ_ASSERT_MSG((outer).contains(inner), (inner) << " is out of " << (outer))

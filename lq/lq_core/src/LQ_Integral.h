@@ -3,6 +3,7 @@
 // magnitudes per orientation bin.
 
 #include "LQ_Image.h"
+#include "LQ_Neon.h"
 
 namespace LQ {
 
@@ -22,6 +23,16 @@ inline BaseRect<int> integralRect(const Image& integral) {
 void computeIntegralHog(const Image& image, Image& target, const BaseRect<int>& rect, ColorMode mode);
 void computeIntegralHog(const unsigned char* data, int stripLength, Image& target, const BaseRect<int>& rect,
                         ColorMode mode);
+
+// One row of sums: out[x + 1] = in[0] + ... + in[x] + above[x + 1], for x below width.
+void integralRowScalar(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
+#if defined(LQ_HAVE_NEON)
+void integralRowNeon(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// SSE2, which every x86-64 processor has
+void integralRowSse(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
+#endif
 
 // 512 x 512 tables addressed [a + 256][b + 256], built at first use
 const unsigned char* getMagnitudes();

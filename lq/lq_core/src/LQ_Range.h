@@ -1,5 +1,6 @@
 #pragma once
 
+#include <limits>
 #include <ostream>
 
 #include "LQ_Point.h"
@@ -8,7 +9,9 @@ namespace LQ {
 
 template <class T>
 struct BaseRange {
-    T lower{}, upper{};
+    // the default is the whole range of T: no limit
+    T lower = std::numeric_limits<T>::lowest();
+    T upper = std::numeric_limits<T>::max();
 
     BaseRange() = default;
     BaseRange(T lower_, T upper_) : lower(lower_), upper(upper_) {}

@@ -3,12 +3,13 @@
 // their own mean plus a margin.
 
 #include "LQ_Image.h"
+#include "LQ_Neon.h"
 
 namespace LQ {
 
 // The interior is always computed whole; rect decides which border lines are filled.
-void computeRmct(const Image& mono, Image& rmct, const BaseRect<int>& rect);
-void computeRmct(const Image& mono, Image& rmct);
+void computeRmct(const Image& image, Image& rmct, const BaseRect<int>& rect);
+void computeRmct(const Image& image, Image& rmct);
 // one code; offsets[0] gives bit 7, offsets[7] bit 0
 unsigned char computeRmctPixel(const unsigned char* source, const int* offsets);
 // entry v: the number of set bits of v
@@ -26,6 +27,11 @@ void rmctRowScalar(const unsigned char* above, const unsigned char* centre, cons
 #if defined(LQ_HAVE_NEON)
 void rmctRowNeon(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
                  unsigned char* target, int width);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// SSE2, which every x86-64 processor has
+void rmctRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
+                unsigned char* target, int width);
 #endif
 
 }  // namespace LQ

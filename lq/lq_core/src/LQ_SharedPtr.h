@@ -155,6 +155,12 @@ public:
     T& operator[](std::ptrdiff_t index) const { return this->pointer_[index]; }
 };
 
+// Holders of related types are equal when they hold the same object.
+template <class T, class U>
+bool operator==(const SharedPtr<T>& a, const SharedPtr<U>& b) {
+    return a.get() == b.get();
+}
+
 template <class T>
 std::ostream& operator<<(std::ostream& stream, const SharedPtr<T>& pointer) {
     stream << "SharedPtr(";

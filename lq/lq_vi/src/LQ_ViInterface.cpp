@@ -25,6 +25,51 @@ std::ostream& operator<<(std::ostream& stream, const ViResult& result) {
     return stream;
 }
 
+void ViResultState::print(std::ostream& stream) const { stream << "ViResultState(" << viResult << ")"; }
+
+namespace {
+template <class T>
+void writeDotCell(std::ostream& stream, const T& value) {
+    stream << value;
+}
+
+void writeDotCell(std::ostream& stream, const std::map<std::string, std::string>& values) {
+    for (const auto& entry : values)
+        stream << "<tr><td border=\"1\">" << entry.first << "</td>\n" << "<td border=\"1\">" << entry.second
+               << "</td></tr>";
+}
+
+template <class T>
+void writeDotField(std::ostream& stream, const char* name, const std::vector<T>& values) {
+    if (values.empty()) return;
+    stream << "  <tr><td border=\"1\">" << name << "</td><td border=\"1\">" << "<table border=\"0\" cellspacing=\"0\">";
+    for (const T& value : values) {
+        stream << "<tr><td border=\"1\">";
+        writeDotCell(stream, value);
+        stream << "</td></tr>";
+    }
+    stream << "</table>" << "</td></tr>\n";
+}
+}  // namespace
+
+void ViResultState::saveToDot(std::ostream& stream, StateAggregator* owner) {
+    const ViResult& r = viResult;
+    stream << "<tr><td border=\"1\">ViResultState</td><td align=\"left\" border=\"1\">";
+    if (r.gestures.empty() && r.floats.empty() && r.rects.empty() && r.points.empty() && r.points3d.empty() &&
+        r.parameters.empty()) {
+        stream << "</td></tr>\n";
+        return;
+    }
+    stream << "<table border=\"0\" cellspacing=\"0\">\n";
+    writeDotField(stream, "gestures", r.gestures);
+    writeDotField(stream, "floats", r.floats);
+    writeDotField(stream, "rects", r.rects);
+    writeDotField(stream, "points", r.points);
+    writeDotField(stream, "points3d", r.points3d);
+    writeDotField(stream, "parameters", r.parameters);
+    stream << "</table></td></tr>\n";
+}
+
 ColorMode ViInterface::parseImageName(const std::string& name) {
     // longer words stand before their prefixes
     static const std::pair<const char*, ColorMode> words[] = {

@@ -11,6 +11,7 @@
 #include "LQ_Image.h"
 #include "LQ_Point.h"
 #include "LQ_Rect.h"
+#include "LQ_StateAggregator.h"
 
 namespace LQ {
 
@@ -69,10 +70,18 @@ protected:
     ViEngineInfo viEngineInfo_;
 };
 
-// The one result of the process: the engine fills it, the C interface copies it.
-class ViResultState {
+// The one result of the process, as a state: it holds no data of its own, so the result
+// is the same object whichever aggregator the state is fetched from. reset() leaves it
+// alone; the frame driver clears the result at the start of each frame.
+class ViResultState : public BaseState {
 public:
+    LQ_STATE_ID
     static ViResult viResult;
+
+    ViResult& result() { return viResult; }
+    void reset() override {}
+    void print(std::ostream& stream) const override;
+    void saveToDot(std::ostream& stream, StateAggregator* owner) override;
 };
 
 // The process-wide list of debug pictures that the host can read.

@@ -2,7 +2,7 @@
 
 #include <sstream>
 
-#include "VI_Yuv420toBgr.h"
+#include "LQ_Yuv420toBgr.h"
 
 LQ::ViFrameParameters viFrameParameters;
 LQ::ViResult viResult;

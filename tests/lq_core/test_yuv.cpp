@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "LogCapture.h"
-#include "VI_Yuv420toBgr.h"
+#include "LQ_Yuv420toBgr.h"
 
 namespace {
 

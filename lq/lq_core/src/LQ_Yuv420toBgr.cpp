@@ -1,4 +1,4 @@
-#include "VI_Yuv420toBgr.h"
+#include "LQ_Yuv420toBgr.h"
 
 #include <utility>
 

@@ -1,0 +1,540 @@
+#include "LQ_ColorSpaceConversion.h"
+
+#include <cstring>
+
+#include "LQ_Depth.h"
+#include "LQ_Gradients.h"
+#include "LQ_ImageCopy.h"
+#include "LQ_Integral.h"
+#include "LQ_RmctTransform.h"
+
+namespace LQ {
+
+// The checks every conversion with a rectangle makes, in this order; `area` is what to write.
+#define LQ_CONVERSION_START(wantedMode, targetMode)                                           \
+    LQ_ASSERT_CONTAINS(source.rect(), rect);                                                  \
+    const BaseRect<int> area = rect.area() == 0 ? source.rect() : rect;                      \
+    LQ_ASSERT_COLOR_MODE(source, wantedMode);                                                 \
+    target.create(source.size(), targetMode)
+
+namespace {
+inline unsigned char luma(int r, int g, int b) { return static_cast<unsigned char>(((129 * g + 66 * r + 25 * b) >> 8) + 16); }
+inline unsigned char chromaU(int r, int g, int b) { return static_cast<unsigned char>(((-38 * r - 74 * g + 112 * b) >> 8) + 128); }
+inline unsigned char chromaV(int r, int g, int b) { return static_cast<unsigned char>(((112 * r - 94 * g - 18 * b) >> 8) + 128); }
+
+// below 0 gives 0, above 255 gives 255, the rest is truncated toward zero
+inline unsigned char clampByte(float value) {
+    if (value < 0) return 0;
+    if (value > 255) return 255;
+    return static_cast<unsigned char>(value);
+}
+
+// Calls f(in, out) for each pixel of area; in and out point at the pixel's bytes.
+template <class In, class Out, class F>
+void forEachPixel(const Image& source, Image& target, const BaseRect<int>& area, F f) {
+    const int inStep = source.depth(), outStep = target.depth();
+    for (int y = area.top; y < area.bottom; ++y) {
+        const In* in = reinterpret_cast<const In*>(source.pixel(area.left, y));
+        Out* out = reinterpret_cast<Out*>(target.pixel(area.left, y));
+        const int inElements = inStep / static_cast<int>(sizeof(In));
+        const int outElements = outStep / static_cast<int>(sizeof(Out));
+        for (int x = 0; x < area.width(); ++x) f(in + x * inElements, out + x * outElements);
+    }
+}
+
+void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b) {
+    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+        q[0] = luma(p[r], p[g], p[b]);
+        q[1] = chromaU(p[r], p[g], p[b]);
+        q[2] = chromaV(p[r], p[g], p[b]);
+    });
+}
+
+void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b, int a) {
+    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+        const float y = p[0], u = p[1] - 128.f, v = p[2] - 128.f;
+        q[r] = clampByte(y + v * 1.370705f);
+        q[g] = clampByte(y + v * -0.698001f + u * -0.337633f);
+        q[b] = clampByte(y + u * 1.732446f);
+        if (a >= 0) q[a] = 255;
+    });
+}
+
+#if defined(LQ_HAVE_SSSE3)
+bool haveSsse3Cpu() {
+    static const bool have = __builtin_cpu_supports("ssse3");
+    return have;
+}
+#endif
+
+// Luma of a rectangle; the vector rows where the pixel layout allows them.
+void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b) {
+    const int step = source.depth();
+    for (int y = area.top; y < area.bottom; ++y) {
+        const unsigned char* in = source.pixel(area.left, y);
+        unsigned char* out = target.pixel(area.left, y);
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+        if (g == 1 && (r == 0 || r == 2)) {
+            lumaRowNeon(in, out, area.width(), step, r);
+            continue;
+        }
+#elif defined(LQ_HAVE_SSSE3)
+        if (step == 3 && g == 1 && (r == 0 || r == 2) && haveSsse3Cpu()) {
+            lumaRowSse(in, out, area.width(), r);
+            continue;
+        }
+#endif
+        lumaRowScalar(in, out, area.width(), step, r, g, b);
+    }
+}
+}  // namespace
+
+void lumaRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r, int g, int b) {
+    for (int x = 0; x < width; ++x, in += step) out[x] = luma(in[r], in[g], in[b]);
+}
+
+#if defined(LQ_HAVE_NEON)
+namespace {
+inline uint8x8_t luma8(uint8x8_t r, uint8x8_t g, uint8x8_t b) {
+    // the weighted sum stays below 65536, so 16 bits hold it exactly
+    uint16x8_t sum = vmull_u8(g, vdup_n_u8(129));
+    sum = vmlal_u8(sum, r, vdup_n_u8(66));
+    sum = vmlal_u8(sum, b, vdup_n_u8(25));
+    return vadd_u8(vshrn_n_u16(sum, 8), vdup_n_u8(16));
+}
+}  // namespace
+
+void lumaRowNeon(const unsigned char* in, unsigned char* out, int width, int step, int r) {
+    int x = 0;
+    if (step == 3) {
+        for (; x + 8 <= width; x += 8) {
+            const uint8x8x3_t p = vld3_u8(in + 3 * x);
+            vst1_u8(out + x, luma8(p.val[r], p.val[1], p.val[2 - r]));
+        }
+    } else if (step == 4) {
+        for (; x + 8 <= width; x += 8) {
+            const uint8x8x4_t p = vld4_u8(in + 4 * x);
+            vst1_u8(out + x, luma8(p.val[r], p.val[1], p.val[2 - r]));
+        }
+    }
+    lumaRowScalar(in + step * x, out + x, width - x, step, r, 1, 2 - r);
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+// pshufb masks that gather channel c of 16 three-byte pixels from the three loads
+struct Deinterleave3 {
+    alignas(16) signed char masks[3][3][16];
+    Deinterleave3() {
+        for (int c = 0; c < 3; ++c)
+            for (int part = 0; part < 3; ++part)
+                for (int i = 0; i < 16; ++i) {
+                    const int at = 3 * i + c - 16 * part;
+                    masks[c][part][i] = static_cast<signed char>(at >= 0 && at < 16 ? at : -128);
+                }
+    }
+};
+const Deinterleave3 kDeinterleave3;
+
+__attribute__((target("ssse3"))) inline __m128i channel(const __m128i* parts, int c) {
+    const __m128i* m = reinterpret_cast<const __m128i*>(kDeinterleave3.masks[c]);
+    return _mm_or_si128(_mm_or_si128(_mm_shuffle_epi8(parts[0], _mm_load_si128(m)),
+                                     _mm_shuffle_epi8(parts[1], _mm_load_si128(m + 1))),
+                        _mm_shuffle_epi8(parts[2], _mm_load_si128(m + 2)));
+}
+
+__attribute__((target("ssse3"))) inline __m128i luma8Sse(__m128i r, __m128i g, __m128i b) {
+    // products and their sum stay below 65536: the low 16 bits are exact
+    const __m128i sum = _mm_add_epi16(_mm_add_epi16(_mm_mullo_epi16(g, _mm_set1_epi16(129)),
+                                                    _mm_mullo_epi16(r, _mm_set1_epi16(66))),
+                                      _mm_mullo_epi16(b, _mm_set1_epi16(25)));
+    return _mm_add_epi16(_mm_srli_epi16(sum, 8), _mm_set1_epi16(16));
+}
+}  // namespace
+
+__attribute__((target("ssse3"))) void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
+    const __m128i zero = _mm_setzero_si128();
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        const __m128i parts[3] = {_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x)),
+                                  _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 16)),
+                                  _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 32))};
+        const __m128i red = channel(parts, r), green = channel(parts, 1), blue = channel(parts, 2 - r);
+        const __m128i low = luma8Sse(_mm_unpacklo_epi8(red, zero), _mm_unpacklo_epi8(green, zero),
+                                     _mm_unpacklo_epi8(blue, zero));
+        const __m128i high = luma8Sse(_mm_unpackhi_epi8(red, zero), _mm_unpackhi_epi8(green, zero),
+                                      _mm_unpackhi_epi8(blue, zero));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x), _mm_packus_epi16(low, high));
+    }
+    lumaRowScalar(in + 3 * x, out + x, width - x, 3, r, 1, 2 - r);
+}
+#endif
+
+// ---- to YUV and mono ---------------------------------------------------------------------
+
+void bgrToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_YUV);
+    rgbToYuvAt(source, target, area, 2, 1, 0);
+}
+
+void rgbToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_YUV);
+    rgbToYuvAt(source, target, area, 0, 1, 2);
+}
+
+void rgbaToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_YUV);
+    rgbToYuvAt(source, target, area, 0, 1, 2);
+}
+
+void monoToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_YUV);
+    forEachPixel<unsigned char, unsigned char>(source, target, area, [](const unsigned char* p, unsigned char* q) {
+        q[0] = static_cast<unsigned char>(((220 * p[0]) >> 8) + 16);
+        q[1] = q[2] = 128;
+    });
+}
+
+void bgrToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_MONO);
+    lumaOf(source, target, area, 2, 1, 0);
+}
+
+void rgbToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_MONO);
+    lumaOf(source, target, area, 0, 1, 2);
+}
+
+void rgbaToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_MONO);
+    lumaOf(source, target, area, 0, 1, 2);
+}
+
+void yuvToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_MONO);
+    for (int y = area.top; y < area.bottom; ++y) {
+        const unsigned char* in = source.pixel(area.left, y);
+        unsigned char* out = target.pixel(area.left, y);
+        for (int x = 0; x < area.width(); ++x) out[x] = in[3 * x];
+    }
+}
+
+void floatToMono(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_MONO);
+    forEachPixel<float, unsigned char>(source, target, area, [=](const float* p, unsigned char* q) {
+        q[0] = clampByte(p[0] * factor + offset);
+    });
+}
+
+void floatToFloat2(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_FLOAT2);
+    forEachPixel<float, float>(source, target, area, [](const float* p, float* q) {
+        q[0] = p[0];
+        q[1] = 0;
+    });
+}
+
+void floatToBgr(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_BGR);
+    forEachPixel<float, unsigned char>(source, target, area, [=](const float* p, unsigned char* q) {
+        q[0] = q[1] = q[2] = clampByte(p[0] * factor + offset);
+    });
+}
+
+// ---- channel orders ----------------------------------------------------------------------
+
+namespace {
+// out[k] = in[order[k]] for the first three bytes; a fourth byte of 255 when asked
+void reorder(const Image& source, Image& target, const BaseRect<int>& area, int c0, int c1, int c2, bool alpha) {
+    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+        const unsigned char a = p[c0], b = p[c1], c = p[c2];
+        q[0] = a, q[1] = b, q[2] = c;
+        if (alpha) q[3] = 255;
+    });
+}
+void spread(const Image& source, Image& target, const BaseRect<int>& area, bool alpha) {
+    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+        q[0] = q[1] = q[2] = p[0];
+        if (alpha) q[3] = 255;
+    });
+}
+void spread16(const Image& source, Image& target, const BaseRect<int>& area, float factor, bool alpha) {
+    forEachPixel<unsigned short, unsigned char>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
+        q[0] = q[1] = q[2] = clampByte(p[0] * factor);
+        if (alpha) q[3] = 255;
+    });
+}
+}  // namespace
+
+void bgrToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_RGBA);
+    reorder(source, target, area, 2, 1, 0, true);
+}
+
+void rgbToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_RGBA);
+    reorder(source, target, area, 0, 1, 2, true);
+}
+
+void bgrToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_RGB);
+    reorder(source, target, area, 2, 1, 0, false);
+}
+
+void rgbToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_BGR);
+    reorder(source, target, area, 2, 1, 0, false);
+}
+
+void rgbaToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_BGR);
+    reorder(source, target, area, 2, 1, 0, false);
+}
+
+void monoToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_BGR);
+    spread(source, target, area, false);
+}
+
+void monoToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_RGB);
+    spread(source, target, area, false);
+}
+
+void monoToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_RGBA);
+    spread(source, target, area, true);
+}
+
+void mono16ToMono(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_MONO);
+    forEachPixel<unsigned short, unsigned char>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
+        q[0] = clampByte(p[0] * factor);
+    });
+}
+
+void mono16ToBgr(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_BGR);
+    spread16(source, target, area, factor, false);
+}
+
+void mono16ToRgb(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_RGB);
+    spread16(source, target, area, factor, false);
+}
+
+void mono16ToRgba(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_RGBA);
+    spread16(source, target, area, factor, true);
+}
+
+void monoToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_FLOAT);
+    forEachPixel<unsigned char, float>(source, target, area, [=](const unsigned char* p, float* q) { q[0] = p[0] * factor; });
+}
+
+void mono16ToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_FLOAT);
+    forEachPixel<unsigned short, float>(source, target, area, [=](const unsigned short* p, float* q) { q[0] = p[0] * factor; });
+}
+
+void yuvToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_BGR);
+    yuvToRgbAt(source, target, area, 2, 1, 0, -1);
+}
+
+void yuvToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGB);
+    yuvToRgbAt(source, target, area, 0, 1, 2, -1);
+}
+
+void yuvToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
+    LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGBA);
+    yuvToRgbAt(source, target, area, 0, 1, 2, 3);
+}
+
+// ---- camera formats ------------------------------------------------------------------------
+
+namespace {
+// zoom 1 or 2; a flip reads the columns from the right
+void nv21ToYuvRows(const unsigned char* nv21, int width, int height, Image& target, int zoom, bool flip) {
+    const unsigned char* chroma = nv21 + static_cast<size_t>(width) * height;
+    const int outWidth = target.width();
+    for (int y = 0; y < target.height(); ++y) {
+        const unsigned char* luma = nv21 + static_cast<size_t>(y * zoom) * width;
+        const unsigned char* pairs = chroma + static_cast<size_t>(y * zoom / 2) * width;
+        unsigned char* out = target.row(y);
+        for (int x = 0; x < outWidth; ++x) {
+            const int column = (flip ? outWidth - 1 - x : x) * zoom;
+            const int pair = column & ~1;
+            out[3 * x] = luma[column];
+            out[3 * x + 1] = pairs[pair + 1];
+            out[3 * x + 2] = pairs[pair];
+        }
+    }
+}
+}  // namespace
+
+void nv21ToYuv(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    const int width = size.width, height = size.height;
+    LQ_ASSERT_MSG(height % 2 == 0, "height must be even: " << height);
+    LQ_ASSERT_MSG(width % 2 == 0, "width must be even: " << width);
+    target.create(size, COLOR_MODE_YUV);
+    nv21ToYuvRows(nv21, width, height, target, 1, false);
+}
+
+void nv21ToYuvFlip(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    const int width = size.width, height = size.height;
+    LQ_ASSERT_MSG(height % 2 == 0, "height must be even: " << height);
+    LQ_ASSERT_MSG(width % 2 == 0, "width must be even: " << width);
+    target.create(size, COLOR_MODE_YUV);
+    nv21ToYuvRows(nv21, width, height, target, 1, true);
+}
+
+void nv21ToYuvZoom2(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    LQ_ASSERT_MSG(size.height % 2 == 0, "height must be even: " << size.height);
+    LQ_ASSERT_MSG(size.width % 2 == 0, "width must be even: " << size.width);
+    target.create(BaseSize<int>(size.width / 2, size.height / 2), COLOR_MODE_YUV);
+    nv21ToYuvRows(nv21, size.width, size.height, target, 2, false);
+}
+
+void nv21ToYuvZoom2Flip(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    LQ_ASSERT_MSG(size.height % 2 == 0, "height must be even: " << size.height);
+    LQ_ASSERT_MSG(size.width % 2 == 0, "width must be even: " << size.width);
+    target.create(BaseSize<int>(size.width / 2, size.height / 2), COLOR_MODE_YUV);
+    nv21ToYuvRows(nv21, size.width, size.height, target, 2, true);
+}
+
+void nv21ToMono(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    LQ_ASSERT_MSG(size.height % 2 == 0, "height must be even: " << size.height);
+    LQ_ASSERT_MSG(size.width % 2 == 0, "width must be even: " << size.width);
+    target.create(size, COLOR_MODE_MONO);
+    for (int y = 0; y < size.height; ++y) std::memcpy(target.row(y), nv21 + static_cast<size_t>(y) * size.width, size.width);
+}
+
+void nv21ToMonoFlip(const unsigned char* nv21, const BaseSize<int>& size, Image& target) {
+    LQ_ASSERT_MSG(size.height % 2 == 0, "height must be even: " << size.height);
+    LQ_ASSERT_MSG(size.width % 2 == 0, "width must be even: " << size.width);
+    target.create(size, COLOR_MODE_MONO);
+    for (int y = 0; y < size.height; ++y) {
+        const unsigned char* in = nv21 + static_cast<size_t>(y) * size.width;
+        unsigned char* out = target.row(y);
+        for (int x = 0; x < size.width; ++x) out[x] = in[size.width - 1 - x];
+    }
+}
+
+void yuvToNv21(const Image& source, SharedArray<unsigned char>& out) {
+    LQ_ASSERT_COLOR_MODE(source, COLOR_MODE_YUV);
+    const int width = source.width() & ~1, height = source.height() & ~1;
+    out = SharedArray<unsigned char>(new unsigned char[static_cast<size_t>(width * height * 1.5)]);
+    unsigned char* luma = out.get();
+    unsigned char* pairs = luma + static_cast<size_t>(width) * height;
+    for (int y = 0; y < height; ++y) {
+        const unsigned char* in = source.row(y);
+        for (int x = 0; x < width; ++x) {
+            *luma++ = in[3 * x];
+            if (x % 2 == 0 && y % 2 == 0) {
+                *pairs++ = in[3 * x + 2];
+                *pairs++ = in[3 * x + 1];
+            }
+        }
+    }
+}
+
+void yuvToYuy2(const Image& source, SharedArray<unsigned char>& out) {
+    LQ_ASSERT_COLOR_MODE(source, COLOR_MODE_YUV);
+    out = SharedArray<unsigned char>(new unsigned char[static_cast<size_t>(source.width()) * source.height() * 2]);
+    if (source.width() % 2) return;
+    unsigned char* q = out.get();
+    for (int y = 0; y < source.height(); ++y) {
+        const unsigned char* p = source.row(y);
+        for (int x = 0; x < source.width(); x += 2, p += 6, q += 4) {
+            q[0] = p[0];
+            q[1] = static_cast<unsigned char>((p[1] + p[4]) >> 1);
+            q[2] = p[3];
+            q[3] = static_cast<unsigned char>((p[2] + p[5]) >> 1);
+        }
+    }
+}
+
+// ---- dispatchers -------------------------------------------------------------------------
+
+void toMono(const Image& source, Image& target, const BaseRect<int>& rect) {
+    switch (source.colorMode()) {
+        case COLOR_MODE_MONO: return copyImage(source, target, rect);
+        case COLOR_MODE_DEPTH: return depthToMono(source, target, 500, 5000, rect);
+        case COLOR_MODE_BGR: return bgrToMono(source, target, rect);
+        case COLOR_MODE_RGB: return rgbToMono(source, target, rect);
+        case COLOR_MODE_YUV: return yuvToMono(source, target, rect);
+        case COLOR_MODE_RGBA: return rgbaToMono(source, target, rect);
+        case COLOR_MODE_FLOAT: return floatToMono(source, target, 0, 1.0f, rect);
+        default: LQ_FAIL("color mode not handled: " << source.colorMode());
+    }
+}
+
+void toBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
+    switch (source.colorMode()) {
+        case COLOR_MODE_MONO: return monoToBgr(source, target, rect);
+        case COLOR_MODE_MONO16: return mono16ToBgr(source, target, 1.0f, rect);
+        case COLOR_MODE_DEPTH: return depthToBgr(source, target, 500, 5000, rect);
+        case COLOR_MODE_BGR: return copyImage(source, target, rect);
+        case COLOR_MODE_RGB: return rgbToBgr(source, target, rect);
+        case COLOR_MODE_YUV: return yuvToBgr(source, target, rect);
+        case COLOR_MODE_RGBA: return rgbaToBgr(source, target, rect);
+        case COLOR_MODE_FLOAT: return floatToBgr(source, target, 0, 100.0f, rect);
+        default: LQ_FAIL("color mode not handled: " << source.colorMode());
+    }
+}
+
+void toRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
+    switch (source.colorMode()) {
+        case COLOR_MODE_MONO: return monoToRgb(source, target, rect);
+        case COLOR_MODE_MONO16: return mono16ToRgb(source, target, 1.0f, rect);
+        case COLOR_MODE_DEPTH: return depthToRgb(source, target, 500, 5000, rect);
+        case COLOR_MODE_BGR: return bgrToRgb(source, target, rect);
+        case COLOR_MODE_RGB: return copyImage(source, target, rect);
+        case COLOR_MODE_YUV: return yuvToRgb(source, target, rect);
+        default: LQ_FAIL("color mode not handled: " << source.colorMode());
+    }
+}
+
+void toRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
+    switch (source.colorMode()) {
+        case COLOR_MODE_MONO: return monoToRgba(source, target, rect);
+        case COLOR_MODE_MONO16: return mono16ToRgba(source, target, 100.0f, rect);
+        case COLOR_MODE_BGR: return bgrToRgba(source, target, rect);
+        case COLOR_MODE_RGB: return rgbToRgba(source, target, rect);
+        case COLOR_MODE_YUV: return yuvToRgba(source, target, rect);
+        case COLOR_MODE_RGBA: return copyImage(source, target, rect);
+        default: LQ_FAIL("color mode not handled: " << source.colorMode());
+    }
+}
+
+void toYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
+    switch (source.colorMode()) {
+        case COLOR_MODE_MONO: return monoToYuv(source, target, rect);
+        case COLOR_MODE_BGR: return bgrToYuv(source, target, rect);
+        case COLOR_MODE_RGB: return rgbToYuv(source, target, rect);
+        case COLOR_MODE_YUV: return copyImage(source, target, rect);
+        case COLOR_MODE_RGBA: return rgbaToYuv(source, target, rect);
+        default: LQ_FAIL("color mode not handled: " << source.colorMode());
+    }
+}
+
+void toColorMode(const Image& source, Image& target, ColorMode mode, const BaseRect<int>& rect) {
+    switch (mode) {
+        case COLOR_MODE_MONO: return toMono(source, target, rect);
+        case COLOR_MODE_DEPTH: return copyImage(source, target, rect);
+        case COLOR_MODE_GRADIENT: return SobelGradient(source, target);
+        case COLOR_MODE_RMCT: return computeRmct(source, target, rect);
+        case COLOR_MODE_BGR: return toBgr(source, target, rect);
+        case COLOR_MODE_RGB: return toRgb(source, target, rect);
+        case COLOR_MODE_YUV: return toYuv(source, target, rect);
+        case COLOR_MODE_RGBA: return toRgba(source, target, rect);
+        case COLOR_MODE_INTEGRAL: return computeIntegral(source, target, rect);
+        default: LQ_FAIL("color mode not handled: " << mode);
+    }
+}
+
+}  // namespace LQ

@@ -1,0 +1,71 @@
+#pragma once
+// Conversions between colour modes. Each conversion with a rectangle checks that the
+// rectangle lies in the source (zero area: the whole image), that the source has the mode
+// it wants, creates the target at the source's full size and writes only the rectangle.
+
+#include "LQ_Image.h"
+#include "LQ_Neon.h"
+#include "LQ_SharedPtr.h"
+
+namespace LQ {
+
+void bgrToYuv(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbToYuv(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbaToYuv(const Image& source, Image& target, const BaseRect<int>& rect);
+void monoToYuv(const Image& source, Image& target, const BaseRect<int>& rect);
+void bgrToMono(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbToMono(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbaToMono(const Image& source, Image& target, const BaseRect<int>& rect);
+void yuvToMono(const Image& source, Image& target, const BaseRect<int>& rect);
+void floatToMono(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect);
+void floatToFloat2(const Image& source, Image& target, const BaseRect<int>& rect);
+void floatToBgr(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect);
+void bgrToRgba(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbToRgba(const Image& source, Image& target, const BaseRect<int>& rect);
+void bgrToRgb(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbToBgr(const Image& source, Image& target, const BaseRect<int>& rect);
+void rgbaToBgr(const Image& source, Image& target, const BaseRect<int>& rect);
+void monoToBgr(const Image& source, Image& target, const BaseRect<int>& rect);
+void monoToRgb(const Image& source, Image& target, const BaseRect<int>& rect);
+void monoToRgba(const Image& source, Image& target, const BaseRect<int>& rect);
+void mono16ToMono(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void mono16ToBgr(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void mono16ToRgb(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void mono16ToRgba(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void monoToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void mono16ToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect);
+void yuvToBgr(const Image& source, Image& target, const BaseRect<int>& rect);
+void yuvToRgb(const Image& source, Image& target, const BaseRect<int>& rect);
+void yuvToRgba(const Image& source, Image& target, const BaseRect<int>& rect);
+
+// NV21: luma plane, then V, U pairs for each 2 x 2 block; both sides must be even
+void nv21ToYuv(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void nv21ToYuvFlip(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void nv21ToYuvZoom2(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void nv21ToYuvZoom2Flip(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void nv21ToMono(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void nv21ToMonoFlip(const unsigned char* nv21, const BaseSize<int>& size, Image& target);
+void yuvToNv21(const Image& source, SharedArray<unsigned char>& out);
+void yuvToYuy2(const Image& source, SharedArray<unsigned char>& out);
+
+// dispatchers by the source's mode
+void toMono(const Image& source, Image& target, const BaseRect<int>& rect);
+void toBgr(const Image& source, Image& target, const BaseRect<int>& rect);
+void toRgb(const Image& source, Image& target, const BaseRect<int>& rect);
+void toRgba(const Image& source, Image& target, const BaseRect<int>& rect);
+void toYuv(const Image& source, Image& target, const BaseRect<int>& rect);
+void toColorMode(const Image& source, Image& target, ColorMode mode, const BaseRect<int>& rect);
+
+// Luma rows, exposed so the vector paths can be compared with the scalar one: pixels of
+// `step` bytes with red, green and blue at the given byte offsets.
+void lumaRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r, int g, int b);
+#if defined(LQ_HAVE_NEON)
+// three- and four-byte pixels; r is 0 or 2
+void lumaRowNeon(const unsigned char* in, unsigned char* out, int width, int step, int r);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// three-byte pixels; r is 0 or 2; needs SSSE3
+void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+#endif
+
+}  // namespace LQ

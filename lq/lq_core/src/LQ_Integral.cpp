@@ -1,0 +1,229 @@
+#include "LQ_Integral.h"
+
+#include <cmath>
+#include <cstring>
+#include <vector>
+
+namespace LQ {
+
+// ---- integral image ------------------------------------------------------------------------
+
+void integralRowScalar(const unsigned char* in, const unsigned int* above, unsigned int* out, int width) {
+    unsigned int run = 0;
+    for (int x = 0; x < width; ++x) {
+        run += in[x];
+        out[x + 1] = run + above[x + 1];
+    }
+}
+
+#if defined(LQ_HAVE_NEON)
+void integralRowNeon(const unsigned char* in, const unsigned int* above, unsigned int* out, int width) {
+    const uint16x8_t zero = vdupq_n_u16(0);
+    uint32x4_t carry = vdupq_n_u32(0);
+    int x = 0;
+    for (; x + 8 <= width; x += 8) {
+        // prefix sums of eight bytes in 16 bits (at most 2040), then widened and carried
+        uint16x8_t s = vmovl_u8(vld1_u8(in + x));
+        s = vaddq_u16(s, vextq_u16(zero, s, 7));
+        s = vaddq_u16(s, vextq_u16(zero, s, 6));
+        s = vaddq_u16(s, vextq_u16(zero, s, 4));
+        const uint32x4_t low = vaddq_u32(vmovl_u16(vget_low_u16(s)), carry);
+        const uint32x4_t high = vaddq_u32(vmovl_u16(vget_high_u16(s)), carry);
+        vst1q_u32(out + x + 1, vaddq_u32(low, vld1q_u32(above + x + 1)));
+        vst1q_u32(out + x + 5, vaddq_u32(high, vld1q_u32(above + x + 5)));
+        carry = vdupq_n_u32(vgetq_lane_u32(high, 3));
+    }
+    unsigned int run = x ? vgetq_lane_u32(carry, 0) : 0;
+    for (; x < width; ++x) {
+        run += in[x];
+        out[x + 1] = run + above[x + 1];
+    }
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+void integralRowSse(const unsigned char* in, const unsigned int* above, unsigned int* out, int width) {
+    const __m128i zero = _mm_setzero_si128();
+    __m128i carry = zero;
+    int x = 0;
+    for (; x + 8 <= width; x += 8) {
+        __m128i s = _mm_unpacklo_epi8(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(in + x)), zero);
+        s = _mm_add_epi16(s, _mm_slli_si128(s, 2));
+        s = _mm_add_epi16(s, _mm_slli_si128(s, 4));
+        s = _mm_add_epi16(s, _mm_slli_si128(s, 8));
+        const __m128i low = _mm_add_epi32(_mm_unpacklo_epi16(s, zero), carry);
+        const __m128i high = _mm_add_epi32(_mm_unpackhi_epi16(s, zero), carry);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x + 1),
+                         _mm_add_epi32(low, _mm_loadu_si128(reinterpret_cast<const __m128i*>(above + x + 1))));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x + 5),
+                         _mm_add_epi32(high, _mm_loadu_si128(reinterpret_cast<const __m128i*>(above + x + 5))));
+        carry = _mm_shuffle_epi32(high, 0xFF);
+    }
+    unsigned int run = static_cast<unsigned int>(_mm_cvtsi128_si32(carry));
+    for (; x < width; ++x) {
+        run += in[x];
+        out[x + 1] = run + above[x + 1];
+    }
+}
+#endif
+
+namespace {
+void integralRow(const unsigned char* in, const unsigned int* above, unsigned int* out, int width) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    integralRowNeon(in, above, out, width);
+#elif defined(LQ_HAVE_SSSE3)
+    integralRowSse(in, above, out, width);
+#else
+    integralRowScalar(in, above, out, width);
+#endif
+}
+}  // namespace
+
+void computeIntegral(const Image& image, Image& integral, const BaseRect<int>& rect) {
+    LQ_ASSERT_COLOR_MODE(image, COLOR_MODE_MONO);
+    LQ_ASSERT_MSG(image.rect().contains(rect),
+                  "Rect must be inside image: rect = " << rect << ", image.rect() = " << image.rect());
+    const BaseRect<int> area = rect.area() == 0 ? image.rect() : rect;
+    const int width = image.width() + 1, height = image.height() + 1;
+    integral.create(BaseSize<int>(width, height), COLOR_MODE_INTEGRAL);
+    // Zero what the sums do not write: rows down to the rectangle's top, the columns left
+    // of it and right of it, and the rows below it. Everything else is overwritten.
+    for (int y = 0; y < height; ++y) {
+        unsigned int* row = integral.row<unsigned int>(y);
+        if (y <= area.top || y > area.bottom) {
+            std::memset(row, 0, sizeof(unsigned int) * width);
+        } else {
+            std::memset(row, 0, sizeof(unsigned int) * (area.left + 1));
+            std::memset(row + area.right + 1, 0, sizeof(unsigned int) * (width - area.right - 1));
+        }
+    }
+    for (int y = area.top; y < area.bottom; ++y) {
+        integralRow(image.row(y) + area.left, integral.row<unsigned int>(y) + area.left,
+                    integral.row<unsigned int>(y + 1) + area.left, area.width());
+    }
+}
+
+void computeIntegral(const Image& image, Image& integral) { computeIntegral(image, integral, image.rect()); }
+
+void computeIntegralOptimized(const Image& image, Image& integral) {
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wsign-compare"
+    LQ_ASSERT_MSG(image.size().width == image.stripLength(), "incorrect stripLength");
+#pragma GCC diagnostic pop
+    computeIntegral(image, integral, image.rect());
+}
+
+void integral_image(const unsigned char* source, unsigned int* target, unsigned int width, unsigned int height) {
+    for (unsigned int y = 0; y < height; ++y) {
+        unsigned int run = 0;
+        for (unsigned int x = 0; x < width; ++x) {
+            run += source[y * width + x];
+            target[y * width + x] = run + (y ? target[(y - 1) * width + x] : 0);
+        }
+    }
+}
+
+// ---- tables ------------------------------------------------------------------------------------
+
+namespace {
+constexpr int kSide = 512;
+inline int at(int a, int b) { return (a + 256) * kSide + (b + 256); }
+
+struct Tables {
+    std::vector<unsigned char> magnitudes, unsigned6, signed12;
+    Tables() : magnitudes(kSide * kSide), unsigned6(kSide * kSide), signed12(kSide * kSide) {
+        const double P = 3.1415927410125732, Q = 6.2831854820251465;
+        for (int a = -255; a <= 255; ++a) {
+            for (int b = -255; b <= 255; ++b) {
+                magnitudes[at(a, b)] = static_cast<unsigned char>(std::fmin(std::sqrt(double(a * a + b * b)), 255.0));
+                int u, s;
+                if (a <= 0 && b <= 0) {
+                    const double angle = std::atan2(a == 0 ? +0.0 : double(a), double(b));
+                    u = static_cast<int>(angle * 6 / P + 6 + 0.5) % 6;
+                    s = static_cast<int>(angle * 12 / Q + 12 + 0.5) % 12;
+                } else if (a == 0) {  // b >= 1
+                    u = unsigned6[at(0, -b)];
+                    s = signed12[at(0, -b)] - 6;
+                } else if (a < 0) {  // b >= 1
+                    u = (6 - unsigned6[at(a, -b)]) % 6;
+                    s = (18 - signed12[at(a, -b)]) % 12;
+                } else if (b < 0) {  // a >= 1
+                    u = (6 - unsigned6[at(-a, b)]) % 6;
+                    s = (12 - signed12[at(-a, b)]) % 12;
+                } else {  // a >= 1, b >= 0
+                    u = unsigned6[at(-a, -b)];
+                    s = signed12[at(-a, -b)] - 6;
+                }
+                unsigned6[at(a, b)] = static_cast<unsigned char>(u);
+                signed12[at(a, b)] = static_cast<unsigned char>(s);
+            }
+        }
+    }
+};
+
+const Tables& tables() {
+    static const Tables built;
+    return built;
+}
+}  // namespace
+
+const unsigned char* getMagnitudes() { return tables().magnitudes.data(); }
+const unsigned char* getHogUnsigned6() { return tables().unsigned6.data(); }
+const unsigned char* getHogSigned12() { return tables().signed12.data(); }
+
+// ---- integral HOG -------------------------------------------------------------------------------
+
+void computeIntegralHog(const unsigned char* data, int stripLength, Image& target, const BaseRect<int>& rect,
+                        ColorMode mode) {
+    int bins = 0;
+    const unsigned char* hog = nullptr;
+    if (mode == COLOR_MODE_INTEGRAL_HOG_SIGNED12) {
+        bins = 12;
+        hog = getHogSigned12();
+    } else if (mode == COLOR_MODE_INTEGRAL_HOG_UNSIGNED6) {
+        bins = 6;
+        hog = getHogUnsigned6();
+    } else {
+        LQ_FAIL("incorrect color mode: " << mode);
+    }
+    const unsigned char* magnitudes = getMagnitudes();
+    const int W = rect.width(), H = rect.height();
+    target.create(BaseSize<int>(W + 1, H + 1), mode);
+    const int channels = bins + 1;
+    for (int y = 0; y <= H; ++y) std::memset(target.row(y), 0, sizeof(unsigned int) * channels * (W + 1));
+    if (W < 3 || H < 3) return;
+
+    unsigned int accumulator[13];
+    const unsigned char* origin = data + static_cast<ptrdiff_t>(rect.top) * stripLength + rect.left;
+    for (int j = 1; j <= H - 2; ++j) {
+        std::memset(accumulator, 0, sizeof(accumulator));
+        const unsigned char* up = origin + static_cast<ptrdiff_t>(j - 1) * stripLength;
+        const unsigned char* mid = up + stripLength;
+        const unsigned char* down = mid + stripLength;
+        const unsigned int* previous = target.row<unsigned int>(j);
+        unsigned int* current = target.row<unsigned int>(j + 1);
+        for (int i = 1; i <= W - 2; ++i) {
+            const int gx = down[i + 1] + up[i + 1] + 2 * (mid[i + 1] - mid[i - 1]) - down[i - 1] - up[i - 1];
+            const int gy = down[i + 1] + down[i - 1] + 2 * (down[i] - up[i]) - up[i + 1] - up[i - 1];
+            const int a = gx / 4, b = gy / 4;
+            const unsigned int m = magnitudes[at(a, b)];
+            accumulator[hog[at(a, b)]] += m;
+            accumulator[bins] += m;
+            const unsigned int* above = previous + (i + 1) * channels;
+            unsigned int* out = current + (i + 1) * channels;
+            for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
+        }
+        const unsigned int* above = previous + W * channels;
+        unsigned int* out = current + W * channels;
+        for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
+    }
+    std::memcpy(target.row(H), target.row(H - 1), sizeof(unsigned int) * channels * (W + 1));
+}
+
+void computeIntegralHog(const Image& image, Image& target, const BaseRect<int>& rect, ColorMode mode) {
+    LQ_ASSERT_COLOR_MODE(image, COLOR_MODE_MONO);
+    LQ_ASSERT_CONTAINS(image.rect(), rect);
+    computeIntegralHog(image.data(), static_cast<int>(image.stripLength()), target, rect, mode);
+}
+
+}  // namespace LQ

@@ -1,0 +1,101 @@
+#pragma once
+// Declared keys, one text of long options in, typed values out. Engines take their
+// options through it; it also reads argc/argv, token lists and option files.
+
+#include <istream>
+#include <map>
+#include <ostream>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "LQ_Utils.h"
+
+namespace LQ {
+
+struct ValueType {
+    enum Value { NONE = 0, STRING = 1, INT = 2, FLOAT = 3, BOOL = 4 };
+};
+
+struct SingleKeyInfo {
+    std::string shortKey;
+    std::string longKey;
+    unsigned int argumentsCount = 0;
+    bool required = false;
+    std::string description;
+    std::string defaultValue;
+    ValueType::Value type = ValueType::NONE;
+};
+
+class CommandLineParser {
+public:
+    CommandLineParser(const std::string& usageHead = std::string(), const std::string& usageTail = std::string());
+
+    // type: a ValueType value; 0 takes no argument
+    void add(const std::string& shortKey, const std::string& longKey, const std::string& defaultValue, bool required,
+             int type, const std::string& description);
+    void setDefaultValue(const std::string& longKey, const std::string& value);
+
+    void parse(int argc, const char* const* argv);
+    void parse(const std::vector<std::string>& tokens);
+    void parse(const std::string& text);
+    void import(const std::string& fileName);
+    void import(std::istream& stream);
+
+    bool isSet(const std::string& key) const;
+    std::string getString(const std::string& key) const;
+    int getInt(const std::string& key) const;
+    float getFloat(const std::string& key) const;
+    bool getBool(const std::string& key) const;
+    template <class T>
+    T get(const std::string& key) const {
+        std::istringstream stream(getString(key));
+        T value{};
+        stream >> value;
+        return value;
+    }
+
+    // the set keys by their long spelling, dashes included
+    std::map<std::string, std::string> getArgs() const;
+    std::string getArgsString() const;
+    const std::vector<std::string>& getAllArgs() const { return args_; }
+    std::string getAllArgsStr() const;
+    const std::vector<std::string>& getUnrecognizedArgs() const { return unrecognizedArgs_; }
+    const std::vector<SingleKeyInfo>& keysInfo() const { return keysInfo_; }
+
+    void printUsage(std::ostream& out) const;
+    // forgets the values; the declarations and the last argument list stay
+    void reset();
+    static void suppressWarnings();
+
+    static bool checkShortKey(const std::string& key);
+    static bool checkLongKey(const std::string& key);
+
+private:
+    void parseBase(const std::vector<std::string>& args);
+    bool findRecognizedKey(const std::vector<std::string>& args, size_t& position);
+    void insertArgument(unsigned int index);
+    void checkRequiredKeysPresence() const;
+    static bool isNumeric(const std::string& text, bool allowPoint);
+    unsigned int indexOf(const std::string& key, const char* before, const char* after) const;
+
+    std::string usageHead_;
+    std::string usageTail_;
+    std::vector<std::string> args_;
+    std::map<std::string, unsigned int> keyIndex_;
+    std::vector<SingleKeyInfo> keysInfo_;
+    std::map<unsigned int, bool> requiredKeys_;
+    std::map<unsigned int, std::string> values_;
+    std::vector<std::string> unrecognizedArgs_;
+};
+
+// the text without enclosing double quotes or braces, trimmed
+std::string getRawValue(const std::string& text);
+// a stand-alone tokeniser into (key, value) pairs, with no declared keys
+void parseString(const std::string& text, std::vector<std::pair<std::string, std::string>>& pairs);
+int countChars(const std::string& text, char character);
+// Cuts the characters of the set from both ends (a text made only of them stays), then
+// one pair of enclosing double quotes.
+void trim(std::string& text, const std::string& characters);
+
+}  // namespace LQ
