@@ -126,6 +126,8 @@ bool allInside(const BaseSize<int>& sourceSize, const BaseSize<int>& targetSize,
 
 bool rotateAndZoomImageNn(const Image& source, Image& target, float angle, float zoom,
                           const BasePoint<float>& sourceCentre, const BasePoint<float>& targetCentre) {
+    // every sample reads a 2 x 2 neighbourhood
+    LQ_ASSERT_MSG(source.width() >= 2 && source.height() >= 2, "source too small to sample: " << source.size());
     float m[4];
     rotationMatrix(angle, zoom, m);
     const int width = target.width(), height = target.height();
@@ -163,7 +165,11 @@ bool rotateAndZoomImageAverage(const Image& source, Image& target, float angle, 
             const int px = static_cast<int>((m[0] * dx + m[1] * dy + sourceCentre.x) * 256) / 256;
             const int py = static_cast<int>((m[2] * dx + m[3] * dy + sourceCentre.y) * 256) / 256;
             BaseRect<int> square(px - side / 2, py - side / 2, px - side / 2 + side, py - side / 2 + side);
-            square.shiftInBoundary(source.rect());
+            // a square larger than the source is cut to it instead
+            if (side <= source.width() && side <= source.height())
+                square.shiftInBoundary(source.rect());
+            else
+                square = square.intersect(source.rect());
             imageMean(source, target.pixel(x, y), square);
         }
     }

@@ -1,0 +1,200 @@
+#include <gtest/gtest.h>
+
+#include <cstring>
+
+#include "LQ_ColorSpaceConversion.h"
+#include "LQ_Depth.h"
+#include "LQ_RmctTransform.h"
+#include "LogCapture.h"
+#include "TestImages.h"
+
+using LQ::Image;
+using LQ::Rect;
+using LQ::Size;
+
+namespace {
+Image pixels(int width, int height, LQ::ColorMode mode, std::initializer_list<int> bytes) {
+    Image image(Size(width, height), mode);
+    int i = 0;
+    for (int b : bytes) image.data()[i++] = static_cast<unsigned char>(b);
+    return image;
+}
+std::vector<int> bytesOf(const Image& image, int x, int y) {
+    std::vector<int> bytes;
+    for (int c = 0; c < image.depth(); ++c) bytes.push_back(image.pixel(x, y)[c]);
+    return bytes;
+}
+}  // namespace
+
+TEST(ColorConversion, FixedPointLumaChromaAndFloatBack) {
+    // white, black, pure red, green, blue in BGR order
+    const Image bgr = pixels(5, 1, LQ::COLOR_MODE_BGR, {255, 255, 255, 0, 0, 0, 0, 0, 255, 0, 255, 0, 255, 0, 0});
+    Image yuv;
+    LQ::bgrToYuv(bgr, yuv, Rect());
+    EXPECT_EQ(bytesOf(yuv, 0, 0), (std::vector<int>{235, 128, 128}));
+    EXPECT_EQ(bytesOf(yuv, 1, 0), (std::vector<int>{16, 128, 128}));
+    // red: Y = (66 * 255 >> 8) + 16, U = (-38 * 255 >> 8) + 128 with an arithmetic shift
+    EXPECT_EQ(bytesOf(yuv, 2, 0), (std::vector<int>{81, 90, 239}));
+    EXPECT_EQ(bytesOf(yuv, 3, 0), (std::vector<int>{144, 54, 34}));
+    EXPECT_EQ(bytesOf(yuv, 4, 0), (std::vector<int>{40, 239, 110}));
+    Image mono, again;
+    LQ::bgrToMono(bgr, mono, Rect());
+    LQ::toMono(yuv, again, Rect());
+    EXPECT_TRUE(samePixels(mono, again));
+    LQ::rgbToMono(pixels(1, 1, LQ::COLOR_MODE_RGB, {255, 0, 0}), mono, Rect());
+    EXPECT_EQ(mono.pixel(0, 0)[0], 81);
+    LQ::rgbaToMono(pixels(1, 1, LQ::COLOR_MODE_RGBA, {0, 0, 255, 9}), mono, Rect());
+    EXPECT_EQ(mono.pixel(0, 0)[0], 40);
+
+    LQ::monoToYuv(pixels(2, 1, LQ::COLOR_MODE_MONO, {255, 0}), yuv, Rect());
+    EXPECT_EQ(bytesOf(yuv, 0, 0), (std::vector<int>{235, 128, 128}));
+    EXPECT_EQ(bytesOf(yuv, 1, 0), (std::vector<int>{16, 128, 128}));
+
+    // no offset of 16 on the way back; clamping at both ends
+    Image back;
+    LQ::yuvToBgr(pixels(3, 1, LQ::COLOR_MODE_YUV, {128, 128, 128, 250, 128, 255, 10, 0, 128}), back, Rect());
+    EXPECT_EQ(bytesOf(back, 0, 0), (std::vector<int>{128, 128, 128}));
+    EXPECT_EQ(bytesOf(back, 1, 0), (std::vector<int>{250, 161, 255}));  // G = 250 - 127 * 0.698001
+    EXPECT_EQ(bytesOf(back, 2, 0), (std::vector<int>{0, 53, 10}));      // B = 10 - 128 * 1.732446 < 0
+    LQ::yuvToRgba(pixels(1, 1, LQ::COLOR_MODE_YUV, {250, 128, 255}), back, Rect());
+    EXPECT_EQ(bytesOf(back, 0, 0), (std::vector<int>{255, 161, 250, 255}));
+}
+
+TEST(ColorConversion, ChannelOrdersSpreadsAndScaledModes) {
+    const Image bgr = pixels(1, 1, LQ::COLOR_MODE_BGR, {1, 2, 3});
+    Image out;
+    LQ::bgrToRgb(bgr, out, Rect());
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{3, 2, 1}));
+    LQ::bgrToRgba(bgr, out, Rect());
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{3, 2, 1, 255}));
+    LQ::rgbaToBgr(pixels(1, 1, LQ::COLOR_MODE_RGBA, {1, 2, 3, 4}), out, Rect());
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{3, 2, 1}));
+    LQ::toRgba(pixels(1, 1, LQ::COLOR_MODE_MONO, {9}), out, Rect());
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{9, 9, 9, 255}));
+
+    Image wide(Size(3, 1), LQ::COLOR_MODE_MONO16);
+    const unsigned short samples[3] = {100, 300, 2};
+    std::memcpy(wide.data(), samples, sizeof(samples));
+    LQ::mono16ToMono(wide, out, 1.0f, Rect());
+    EXPECT_EQ(bytesOf(out, 1, 0), std::vector<int>{255});
+    LQ::toRgba(wide, out, Rect());  // factor 100
+    EXPECT_EQ(bytesOf(out, 2, 0), (std::vector<int>{200, 200, 200, 255}));
+    LQ::monoToFloat(pixels(1, 1, LQ::COLOR_MODE_MONO, {3}), out, 0.5f, Rect());
+    EXPECT_EQ(out.row<float>(0)[0], 1.5f);
+    Image floats(Size(3, 1), LQ::COLOR_MODE_FLOAT);
+    const float values[3] = {-0.5f, 2.559f, 7.f};
+    std::memcpy(floats.data(), values, sizeof(values));
+    LQ::toBgr(floats, out, Rect());  // factor 100: 0, 255.9 truncated, 700 clamped
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{0, 0, 0}));
+    EXPECT_EQ(bytesOf(out, 1, 0), (std::vector<int>{255, 255, 255}));
+    LQ::floatToMono(floats, out, 10.f, 1.f, Rect());
+    EXPECT_EQ(bytesOf(out, 1, 0), std::vector<int>{12});
+    LQ::floatToFloat2(floats, out, Rect());
+    EXPECT_EQ(out.row<float>(0)[4], 7.f);
+    EXPECT_EQ(out.row<float>(0)[5], 0.f);
+}
+
+TEST(ColorConversion, RectanglesAndChecks) {
+    const Image bgr = randomImage(6, 5, LQ::COLOR_MODE_BGR, 3);
+    Image full, part(Size(6, 5), LQ::COLOR_MODE_MONO);
+    LQ::bgrToMono(bgr, full, Rect());
+    std::memset(part.data(), 7, 30);
+    unsigned char* buffer = part.data();
+    LQ::bgrToMono(bgr, part, Rect(5, 4, 6, 5));  // one pixel at the corner
+    EXPECT_EQ(part.data(), buffer);              // the right size and mode: no new buffer
+    EXPECT_EQ(part.pixel(5, 4)[0], full.pixel(5, 4)[0]);
+    EXPECT_EQ(part.pixel(4, 4)[0], 7);
+    EXPECT_EQ(part.pixel(5, 3)[0], 7);
+
+    FailedCheck check = catchCheck([&] { LQ::bgrToMono(bgr, part, Rect(0, 0, 7, 5)); });
+    EXPECT_EQ(check.expression, "(source.rect()).contains(rect)");
+    EXPECT_EQ(check.tail, "Rect(0, 0, 7, 5) is out of Rect(0, 0, 6, 5)");
+    check = catchCheck([&] { LQ::rgbToYuv(bgr, part, Rect()); });
+    EXPECT_EQ(check.expression, "(source).colorMode() == (COLOR_MODE_RGB)");
+    EXPECT_EQ(check.tail, "have COLOR_MODE_BGR, but need COLOR_MODE_RGB");
+    check = catchCheck([&] { LQ::toMono(Image(Size(2, 2), LQ::COLOR_MODE_MONO16), part, Rect()); });
+    EXPECT_EQ(check.expression, "0");
+    EXPECT_EQ(check.tail, "color mode not handled: COLOR_MODE_MONO16");
+    check = catchCheck([&] { LQ::toColorMode(bgr, part, LQ::COLOR_MODE_FLOAT, Rect()); });
+    EXPECT_EQ(check.tail, "color mode not handled: COLOR_MODE_FLOAT");
+
+    // the feature modes go through the dispatcher too
+    Image mono, census, reference;
+    LQ::bgrToMono(bgr, mono, Rect());
+    LQ::toColorMode(mono, census, LQ::COLOR_MODE_RMCT, Rect());
+    LQ::computeRmct(mono, reference, Rect());
+    EXPECT_TRUE(samePixels(census, reference));
+    LQ::toColorMode(mono, census, LQ::COLOR_MODE_INTEGRAL, Rect());
+    EXPECT_EQ(census.size(), Size(7, 6));
+}
+
+TEST(ColorConversion, CameraFormats) {
+    // 4 x 4 luma 0..15, chroma rows (V, U) pairs: (200, 100) (210, 110) / (220, 120) (230, 130)
+    std::vector<unsigned char> nv21(24);
+    for (int i = 0; i < 16; ++i) nv21[i] = static_cast<unsigned char>(i);
+    const unsigned char chroma[8] = {200, 100, 210, 110, 220, 120, 230, 130};
+    std::memcpy(nv21.data() + 16, chroma, 8);
+    Image yuv;
+    LQ::nv21ToYuv(nv21.data(), Size(4, 4), yuv);
+    EXPECT_EQ(bytesOf(yuv, 3, 1), (std::vector<int>{7, 110, 210}));
+    EXPECT_EQ(bytesOf(yuv, 0, 2), (std::vector<int>{8, 120, 220}));
+    LQ::nv21ToYuvFlip(nv21.data(), Size(4, 4), yuv);
+    EXPECT_EQ(bytesOf(yuv, 0, 1), (std::vector<int>{7, 110, 210}));
+    LQ::nv21ToYuvZoom2(nv21.data(), Size(4, 4), yuv);
+    ASSERT_EQ(yuv.size(), Size(2, 2));
+    EXPECT_EQ(bytesOf(yuv, 0, 0), (std::vector<int>{0, 100, 200}));
+    EXPECT_EQ(bytesOf(yuv, 1, 0), (std::vector<int>{2, 110, 210}));
+    EXPECT_EQ(bytesOf(yuv, 0, 1), (std::vector<int>{8, 120, 220}));
+    EXPECT_EQ(bytesOf(yuv, 1, 1), (std::vector<int>{10, 130, 230}));
+    LQ::nv21ToYuvZoom2Flip(nv21.data(), Size(4, 4), yuv);
+    EXPECT_EQ(bytesOf(yuv, 0, 1), (std::vector<int>{10, 130, 230}));
+    Image mono;
+    LQ::nv21ToMonoFlip(nv21.data(), Size(4, 4), mono);
+    EXPECT_EQ(mono.pixel(0, 3)[0], 15);
+
+    FailedCheck check = catchCheck([&] { LQ::nv21ToYuv(nv21.data(), Size(4, 3), yuv); });
+    EXPECT_EQ(check.expression, "height % 2 == 0");
+    EXPECT_EQ(check.tail, "height must be even: 3");
+    check = catchCheck([&] { LQ::nv21ToMono(nv21.data(), Size(3, 4), yuv); });
+    EXPECT_EQ(check.expression, "size.width % 2 == 0");
+
+    // back to NV21: the odd last row and column are dropped
+    LQ::SharedArray<unsigned char> block;
+    LQ::nv21ToYuv(nv21.data(), Size(4, 4), yuv);
+    LQ::yuvToNv21(yuv, block);
+    EXPECT_EQ(0, std::memcmp(block.get(), nv21.data(), 24));
+    Image odd = randomImage(5, 5, LQ::COLOR_MODE_YUV, 4);
+    LQ::yuvToNv21(odd, block);
+    EXPECT_EQ(block[15], odd.pixel(3, 3)[0]);
+    EXPECT_EQ(block[16 + 6], odd.pixel(2, 2)[2]);  // the last pair: V, U of (2, 2)
+    EXPECT_EQ(block[16 + 7], odd.pixel(2, 2)[1]);
+    LQ::yuvToYuy2(pixels(2, 1, LQ::COLOR_MODE_YUV, {10, 100, 201, 20, 103, 50}), block);
+    EXPECT_EQ((std::vector<int>{block[0], block[1], block[2], block[3]}), (std::vector<int>{10, 101, 20, 125}));
+}
+
+TEST(ColorConversion, DepthRamp) {
+    unsigned char r, g, b;
+    LQ::pixelToRGB(500, r, g, b, 500, 5000);
+    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{0, 0, 0}));
+    LQ::pixelToRGB(5000, r, g, b, 500, 5000);
+    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{0, 0, 0}));
+    LQ::pixelToRGB(600, r, g, b, 500, 5000);  // t = 100 * 765 / 4500 = 17
+    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{255, 17, 0}));
+    LQ::pixelToRGB(2500, r, g, b, 500, 5000);  // t = 340: the middle segment
+    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{static_cast<unsigned char>(254 - 340), 255, static_cast<unsigned char>(342)}));
+    LQ::pixelToRGB(4000, r, g, b, 500, 5000);  // t = 595
+    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{static_cast<unsigned char>(598), static_cast<unsigned char>(252 - 595), 255}));
+    FailedCheck check = catchCheck([&] { LQ::pixelToRGB(1, r, g, b, 7, 7); });
+    EXPECT_EQ(check.expression, "(maxDepth) > (minDepth)");
+    EXPECT_EQ(check.tail, "7 <= 7");
+
+    Image depth(Size(2, 1), LQ::COLOR_MODE_DEPTH);
+    const unsigned short samples[2] = {600, 400};
+    std::memcpy(depth.data(), samples, sizeof(samples));
+    Image out;
+    LQ::toBgr(depth, out, Rect());
+    EXPECT_EQ(bytesOf(out, 0, 0), (std::vector<int>{0, 17, 255}));
+    LQ::toMono(depth, out, Rect());
+    EXPECT_EQ(out.pixel(0, 0)[0], 5);                                   // 255 / 4500 * 100
+    EXPECT_EQ(out.pixel(1, 0)[0], static_cast<unsigned char>(-5));      // below the range: wraps
+}
