@@ -80,6 +80,8 @@ TEST(StateAggregator, NamedStatesPrintTheirValues) {
     engine->get<LQ::MultiState>().push_back(object);
     EXPECT_EQ(engine->get<LQ::MultiState>().size(), 1u);
     EXPECT_EQ(object.useCount(), 2);
+    engine->reset();  // objects and the engine hold each other: a reset breaks the ring
+    EXPECT_EQ(object.useCount(), 1);
 }
 
 TEST(StateAggregator, GraphDumpFollowsChildAggregators) {

@@ -26,7 +26,11 @@ ViDetectorInterface::ViDetectorInterface() : commandLineParser_("Engine options:
     commandLineParser_.add("-f", "--flip", "false", 0, 4, "Flip output results position corresponding first image.");
 }
 
-ViDetectorInterface::~ViDetectorInterface() = default;
+ViDetectorInterface::~ViDetectorInterface() {
+    // objects hold the engine's state through their parent link and the engine's state
+    // holds the objects: emptying the states breaks that ring so both can go
+    if (stateAggregator_) stateAggregator_->reset();
+}
 
 ViEngineInfo& ViDetectorInterface::getEngineInfo() {
     std::vector<std::string>& names = viEngineInfo_.imageNames;
