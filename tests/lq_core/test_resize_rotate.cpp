@@ -143,6 +143,20 @@ TEST(Rotate, QuarterTurnsFlipsAndTranspose) {
     FailedCheck check = catchCheck([&] { LQ::flipLeftRight(Image(), flipped); });
     EXPECT_EQ(check.expression, "(source).isCreated()");
 
+    // byte images take a path of their own: it must agree with the path of wider pixels
+    const Image mono = randomImage(21, 13, LQ::COLOR_MODE_MONO, 31);
+    Image wide(mono.size(), LQ::COLOR_MODE_RGB);
+    for (int y = 0; y < 13; ++y)
+        for (int x = 0; x < 21; ++x) wide.pixel(x, y)[0] = wide.pixel(x, y)[1] = wide.pixel(x, y)[2] = mono.pixel(x, y)[0];
+    for (int turns = 1; turns <= 3; ++turns) {
+        Image turnedMono, turnedWide;
+        LQ::rotatePi4(mono, turnedMono, turns);
+        LQ::rotatePi4(wide, turnedWide, turns);
+        for (int y = 0; y < turnedMono.height(); ++y)
+            for (int x = 0; x < turnedMono.width(); ++x)
+                ASSERT_EQ(turnedMono.pixel(x, y)[0], turnedWide.pixel(x, y)[1]) << turns << ": " << x << "," << y;
+    }
+
     // views with a wide stride and every small size: a quarter turn and back is the identity
     for (int width = 1; width <= 9; ++width)
         for (int height = 1; height <= 9; ++height) {

@@ -29,34 +29,37 @@ inline unsigned char clampByte(float value) {
     return static_cast<unsigned char>(value);
 }
 
-// Calls f(in, out) for each pixel of area; in and out point at the pixel's bytes.
-template <class In, class Out, class F>
+// Calls f(in, out) for each pixel of area; in and out point at the pixel's elements. The
+// pixel sizes are constants so that the loop unrolls and vectorises.
+template <class In, class Out, int InElements, int OutElements, class F>
 void forEachPixel(const Image& source, Image& target, const BaseRect<int>& area, F f) {
-    const int inStep = source.depth(), outStep = target.depth();
+    const int width = area.width();
     for (int y = area.top; y < area.bottom; ++y) {
-        const In* in = reinterpret_cast<const In*>(source.pixel(area.left, y));
-        Out* out = reinterpret_cast<Out*>(target.pixel(area.left, y));
-        const int inElements = inStep / static_cast<int>(sizeof(In));
-        const int outElements = outStep / static_cast<int>(sizeof(Out));
-        for (int x = 0; x < area.width(); ++x) f(in + x * inElements, out + x * outElements);
+        const In* __restrict in = reinterpret_cast<const In*>(source.pixel(area.left, y));
+        Out* __restrict out = reinterpret_cast<Out*>(target.pixel(area.left, y));
+        for (int x = 0; x < width; ++x) f(in + x * InElements, out + x * OutElements);
     }
 }
 
-void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b) {
-    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+template <int Step, int r, int b>
+void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area) {
+    constexpr int g = 1;
+    forEachPixel<unsigned char, unsigned char, Step, 3>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         q[0] = luma(p[r], p[g], p[b]);
         q[1] = chromaU(p[r], p[g], p[b]);
         q[2] = chromaV(p[r], p[g], p[b]);
     });
 }
 
-void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b, int a) {
-    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+template <int Step, int r, int b, int a>
+void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area) {
+    constexpr int g = 1;
+    forEachPixel<unsigned char, unsigned char, 3, Step>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         const float y = p[0], u = p[1] - 128.f, v = p[2] - 128.f;
         q[r] = clampByte(y + v * 1.370705f);
         q[g] = clampByte(y + v * -0.698001f + u * -0.337633f);
         q[b] = clampByte(y + u * 1.732446f);
-        if (a >= 0) q[a] = 255;
+        if (a >= 0) q[a < 0 ? 0 : a] = 255;
     });
 }
 
@@ -175,22 +178,22 @@ __attribute__((target("ssse3"))) void lumaRowSse(const unsigned char* in, unsign
 
 void bgrToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_YUV);
-    rgbToYuvAt(source, target, area, 2, 1, 0);
+    rgbToYuvAt<3, 2, 0>(source, target, area);
 }
 
 void rgbToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_YUV);
-    rgbToYuvAt(source, target, area, 0, 1, 2);
+    rgbToYuvAt<3, 0, 2>(source, target, area);
 }
 
 void rgbaToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_YUV);
-    rgbToYuvAt(source, target, area, 0, 1, 2);
+    rgbToYuvAt<4, 0, 2>(source, target, area);
 }
 
 void monoToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_YUV);
-    forEachPixel<unsigned char, unsigned char>(source, target, area, [](const unsigned char* p, unsigned char* q) {
+    forEachPixel<unsigned char, unsigned char, 1, 3>(source, target, area, [](const unsigned char* p, unsigned char* q) {
         q[0] = static_cast<unsigned char>(((220 * p[0]) >> 8) + 16);
         q[1] = q[2] = 128;
     });
@@ -222,14 +225,14 @@ void yuvToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
 
 void floatToMono(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_MONO);
-    forEachPixel<float, unsigned char>(source, target, area, [=](const float* p, unsigned char* q) {
+    forEachPixel<float, unsigned char, 1, 1>(source, target, area, [=](const float* p, unsigned char* q) {
         q[0] = clampByte(p[0] * factor + offset);
     });
 }
 
 void floatToFloat2(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_FLOAT2);
-    forEachPixel<float, float>(source, target, area, [](const float* p, float* q) {
+    forEachPixel<float, float, 1, 2>(source, target, area, [](const float* p, float* q) {
         q[0] = p[0];
         q[1] = 0;
     });
@@ -237,7 +240,7 @@ void floatToFloat2(const Image& source, Image& target, const BaseRect<int>& rect
 
 void floatToBgr(const Image& source, Image& target, float offset, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_FLOAT, COLOR_MODE_BGR);
-    forEachPixel<float, unsigned char>(source, target, area, [=](const float* p, unsigned char* q) {
+    forEachPixel<float, unsigned char, 1, 3>(source, target, area, [=](const float* p, unsigned char* q) {
         q[0] = q[1] = q[2] = clampByte(p[0] * factor + offset);
     });
 }
@@ -246,112 +249,116 @@ void floatToBgr(const Image& source, Image& target, float offset, float factor, 
 
 namespace {
 // out[k] = in[order[k]] for the first three bytes; a fourth byte of 255 when asked
-void reorder(const Image& source, Image& target, const BaseRect<int>& area, int c0, int c1, int c2, bool alpha) {
-    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+template <int InStep, int OutStep, int c0, int c2, bool alpha>
+void reorder(const Image& source, Image& target, const BaseRect<int>& area) {
+    constexpr int c1 = 1;
+    forEachPixel<unsigned char, unsigned char, InStep, OutStep>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         const unsigned char a = p[c0], b = p[c1], c = p[c2];
         q[0] = a, q[1] = b, q[2] = c;
-        if (alpha) q[3] = 255;
+        if (alpha) q[OutStep - 1] = 255;
     });
 }
-void spread(const Image& source, Image& target, const BaseRect<int>& area, bool alpha) {
-    forEachPixel<unsigned char, unsigned char>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
+template <int OutStep, bool alpha>
+void spread(const Image& source, Image& target, const BaseRect<int>& area) {
+    forEachPixel<unsigned char, unsigned char, 1, OutStep>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         q[0] = q[1] = q[2] = p[0];
-        if (alpha) q[3] = 255;
+        if (alpha) q[OutStep - 1] = 255;
     });
 }
-void spread16(const Image& source, Image& target, const BaseRect<int>& area, float factor, bool alpha) {
-    forEachPixel<unsigned short, unsigned char>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
+template <int OutStep, bool alpha>
+void spread16(const Image& source, Image& target, const BaseRect<int>& area, float factor) {
+    forEachPixel<unsigned short, unsigned char, 1, OutStep>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
         q[0] = q[1] = q[2] = clampByte(p[0] * factor);
-        if (alpha) q[3] = 255;
+        if (alpha) q[OutStep - 1] = 255;
     });
 }
 }  // namespace
 
 void bgrToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_RGBA);
-    reorder(source, target, area, 2, 1, 0, true);
+    reorder<3, 4, 2, 0, true>(source, target, area);
 }
 
 void rgbToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_RGBA);
-    reorder(source, target, area, 0, 1, 2, true);
+    reorder<3, 4, 0, 2, true>(source, target, area);
 }
 
 void bgrToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_RGB);
-    reorder(source, target, area, 2, 1, 0, false);
+    reorder<3, 3, 2, 0, false>(source, target, area);
 }
 
 void rgbToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_BGR);
-    reorder(source, target, area, 2, 1, 0, false);
+    reorder<3, 3, 2, 0, false>(source, target, area);
 }
 
 void rgbaToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_BGR);
-    reorder(source, target, area, 2, 1, 0, false);
+    reorder<4, 3, 2, 0, false>(source, target, area);
 }
 
 void monoToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_BGR);
-    spread(source, target, area, false);
+    spread<3, false>(source, target, area);
 }
 
 void monoToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_RGB);
-    spread(source, target, area, false);
+    spread<3, false>(source, target, area);
 }
 
 void monoToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_RGBA);
-    spread(source, target, area, true);
+    spread<4, true>(source, target, area);
 }
 
 void mono16ToMono(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_MONO);
-    forEachPixel<unsigned short, unsigned char>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
+    forEachPixel<unsigned short, unsigned char, 1, 1>(source, target, area, [=](const unsigned short* p, unsigned char* q) {
         q[0] = clampByte(p[0] * factor);
     });
 }
 
 void mono16ToBgr(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_BGR);
-    spread16(source, target, area, factor, false);
+    spread16<3, false>(source, target, area, factor);
 }
 
 void mono16ToRgb(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_RGB);
-    spread16(source, target, area, factor, false);
+    spread16<3, false>(source, target, area, factor);
 }
 
 void mono16ToRgba(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_RGBA);
-    spread16(source, target, area, factor, true);
+    spread16<4, true>(source, target, area, factor);
 }
 
 void monoToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO, COLOR_MODE_FLOAT);
-    forEachPixel<unsigned char, float>(source, target, area, [=](const unsigned char* p, float* q) { q[0] = p[0] * factor; });
+    forEachPixel<unsigned char, float, 1, 1>(source, target, area, [=](const unsigned char* p, float* q) { q[0] = p[0] * factor; });
 }
 
 void mono16ToFloat(const Image& source, Image& target, float factor, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_MONO16, COLOR_MODE_FLOAT);
-    forEachPixel<unsigned short, float>(source, target, area, [=](const unsigned short* p, float* q) { q[0] = p[0] * factor; });
+    forEachPixel<unsigned short, float, 1, 1>(source, target, area, [=](const unsigned short* p, float* q) { q[0] = p[0] * factor; });
 }
 
 void yuvToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_BGR);
-    yuvToRgbAt(source, target, area, 2, 1, 0, -1);
+    yuvToRgbAt<3, 2, 0, -1>(source, target, area);
 }
 
 void yuvToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGB);
-    yuvToRgbAt(source, target, area, 0, 1, 2, -1);
+    yuvToRgbAt<3, 0, 2, -1>(source, target, area);
 }
 
 void yuvToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGBA);
-    yuvToRgbAt(source, target, area, 0, 1, 2, 3);
+    yuvToRgbAt<4, 0, 2, 3>(source, target, area);
 }
 
 // ---- camera formats ------------------------------------------------------------------------
