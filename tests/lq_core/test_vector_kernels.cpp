@@ -25,7 +25,7 @@ std::vector<unsigned char> testRow(size_t count, std::mt19937& random, int kind)
 template <class Vector>
 void compareLuma(Vector vectorRow, int step) {
     std::mt19937 random(7);
-    for (int width = 1; width <= 67; ++width)
+    for (int width = 1; width <= 99; ++width)
         for (int kind = 0; kind < 3; ++kind)
             for (int r : {0, 2}) {
                 const std::vector<unsigned char> in = testRow(static_cast<size_t>(width) * step, random, kind);
@@ -97,5 +97,26 @@ TEST(VectorKernels, X86RowsEqualScalarRows) {
     compareHalving(LQ::zoomMonoTwiceRowSse);
     compareCensus(LQ::rmctRowSse);
     compareIntegral(LQ::integralRowSse);
+
+    if (__builtin_cpu_supports("avx2"))
+        compareLuma([](const unsigned char* in, unsigned char* out, int width, int, int r) { LQ::lumaRowAvx2(in, out, width, r); }, 3);
+
+    // the byte moves of the colour conversions, against their plain loops
+    std::mt19937 random(19);
+    for (int width = 1; width <= 67; ++width) {
+        const std::vector<unsigned char> pixels = randomBytes(3 * width, random), bytes = randomBytes(width, random);
+        std::vector<unsigned char> channel(width), spread(3 * width), swapped(3 * width);
+        LQ::channelRowSse(pixels.data(), channel.data(), width, 0);
+        LQ::spreadRowSse(bytes.data(), spread.data(), width);
+        LQ::swapRowSse(pixels.data(), swapped.data(), width);
+        for (int x = 0; x < width; ++x) {
+            ASSERT_EQ(channel[x], pixels[3 * x]) << width;
+            ASSERT_EQ(spread[3 * x + 2], bytes[x]) << width;
+            ASSERT_EQ(spread[3 * x], bytes[x]) << width;
+            ASSERT_EQ(swapped[3 * x], pixels[3 * x + 2]) << width;
+            ASSERT_EQ(swapped[3 * x + 1], pixels[3 * x + 1]) << width;
+            ASSERT_EQ(swapped[3 * x + 2], pixels[3 * x]) << width;
+        }
+    }
 }
 #endif

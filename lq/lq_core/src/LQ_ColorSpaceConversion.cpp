@@ -68,6 +68,10 @@ bool haveSsse3Cpu() {
     static const bool have = __builtin_cpu_supports("ssse3");
     return have;
 }
+bool haveAvx2Cpu() {
+    static const bool have = __builtin_cpu_supports("avx2");
+    return have;
+}
 #endif
 
 // Luma of a rectangle; the vector rows where the pixel layout allows them.
@@ -82,6 +86,10 @@ void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r
             continue;
         }
 #elif defined(LQ_HAVE_SSSE3)
+        if (step == 3 && g == 1 && (r == 0 || r == 2) && haveAvx2Cpu()) {
+            lumaRowAvx2(in, out, area.width(), r);
+            continue;
+        }
         if (step == 3 && g == 1 && (r == 0 || r == 2) && haveSsse3Cpu()) {
             lumaRowSse(in, out, area.width(), r);
             continue;
@@ -154,7 +162,93 @@ __attribute__((target("ssse3"))) inline __m128i luma8Sse(__m128i r, __m128i g, _
                                       _mm_mullo_epi16(b, _mm_set1_epi16(25)));
     return _mm_add_epi16(_mm_srli_epi16(sum, 8), _mm_set1_epi16(16));
 }
+// masks that spread 16 bytes into 48, each byte three times
+struct Spread3 {
+    alignas(16) signed char masks[3][16];
+    Spread3() {
+        for (int part = 0; part < 3; ++part)
+            for (int i = 0; i < 16; ++i) masks[part][i] = static_cast<signed char>((16 * part + i) / 3);
+    }
+};
+const Spread3 kSpread3;
+
+// swaps bytes 0 and 2 of each of the five pixels in the first 15 bytes; byte 15 stays
+alignas(16) const signed char kSwap3[16] = {2, 1, 0, 5, 4, 3, 8, 7, 6, 11, 10, 9, 14, 13, 12, 15};
 }  // namespace
+
+namespace {
+__attribute__((target("avx2"))) inline __m256i channel32(const __m256i* parts, int c) {
+    const __m128i* m = reinterpret_cast<const __m128i*>(kDeinterleave3.masks[c]);
+    const __m256i m0 = _mm256_broadcastsi128_si256(_mm_load_si128(m));
+    const __m256i m1 = _mm256_broadcastsi128_si256(_mm_load_si128(m + 1));
+    const __m256i m2 = _mm256_broadcastsi128_si256(_mm_load_si128(m + 2));
+    return _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(parts[0], m0), _mm256_shuffle_epi8(parts[1], m1)),
+                           _mm256_shuffle_epi8(parts[2], m2));
+}
+
+__attribute__((target("avx2"))) inline __m256i luma16Avx(__m256i r, __m256i g, __m256i b) {
+    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_mullo_epi16(g, _mm256_set1_epi16(129)),
+                                                          _mm256_mullo_epi16(r, _mm256_set1_epi16(66))),
+                                         _mm256_mullo_epi16(b, _mm256_set1_epi16(25)));
+    return _mm256_add_epi16(_mm256_srli_epi16(sum, 8), _mm256_set1_epi16(16));
+}
+}  // namespace
+
+// 32 pixels a step: each 128-bit lane takes 16 of them, as the SSSE3 row does
+__attribute__((target("avx2"))) void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    const __m256i zero = _mm256_setzero_si256();
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const unsigned char* p = in + 3 * x;
+        __m256i parts[3];
+        for (int k = 0; k < 3; ++k)
+            parts[k] = _mm256_inserti128_si256(
+                _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p + 16 * k))),
+                _mm_loadu_si128(reinterpret_cast<const __m128i*>(p + 48 + 16 * k)), 1);
+        const __m256i red = channel32(parts, r), green = channel32(parts, 1), blue = channel32(parts, 2 - r);
+        const __m256i low = luma16Avx(_mm256_unpacklo_epi8(red, zero), _mm256_unpacklo_epi8(green, zero),
+                                      _mm256_unpacklo_epi8(blue, zero));
+        const __m256i high = luma16Avx(_mm256_unpackhi_epi8(red, zero), _mm256_unpackhi_epi8(green, zero),
+                                       _mm256_unpackhi_epi8(blue, zero));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_packus_epi16(low, high));
+    }
+    lumaRowSse(in + 3 * x, out + x, width - x, r);
+}
+
+__attribute__((target("ssse3"))) void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c) {
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        const __m128i parts[3] = {_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x)),
+                                  _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 16)),
+                                  _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 32))};
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x), channel(parts, c));
+    }
+    for (; x < width; ++x) out[x] = in[3 * x + c];
+}
+
+__attribute__((target("ssse3"))) void spreadRowSse(const unsigned char* in, unsigned char* out, int width) {
+    const __m128i* m = reinterpret_cast<const __m128i*>(kSpread3.masks);
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + x));
+        for (int part = 0; part < 3; ++part)
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 3 * x + 16 * part), _mm_shuffle_epi8(v, _mm_load_si128(m + part)));
+    }
+    for (; x < width; ++x) out[3 * x] = out[3 * x + 1] = out[3 * x + 2] = in[x];
+}
+
+__attribute__((target("ssse3"))) void swapRowSse(const unsigned char* in, unsigned char* out, int width) {
+    const __m128i mask = _mm_load_si128(reinterpret_cast<const __m128i*>(kSwap3));
+    int x = 0;
+    // five pixels a step; the sixteenth byte written is the next step's first
+    for (; x + 6 <= width; x += 5)
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 3 * x),
+                         _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x)), mask));
+    for (; x < width; ++x) {
+        const unsigned char a = in[3 * x], b = in[3 * x + 1], c = in[3 * x + 2];
+        out[3 * x] = c, out[3 * x + 1] = b, out[3 * x + 2] = a;
+    }
+}
 
 __attribute__((target("ssse3"))) void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
     const __m128i zero = _mm_setzero_si128();
@@ -219,6 +313,12 @@ void yuvToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
     for (int y = area.top; y < area.bottom; ++y) {
         const unsigned char* in = source.pixel(area.left, y);
         unsigned char* out = target.pixel(area.left, y);
+#if defined(LQ_HAVE_SSSE3)
+        if (haveSsse3Cpu()) {
+            channelRowSse(in, out, area.width(), 0);
+            continue;
+        }
+#endif
         for (int x = 0; x < area.width(); ++x) out[x] = in[3 * x];
     }
 }
@@ -251,6 +351,15 @@ namespace {
 // out[k] = in[order[k]] for the first three bytes; a fourth byte of 255 when asked
 template <int InStep, int OutStep, int c0, int c2, bool alpha>
 void reorder(const Image& source, Image& target, const BaseRect<int>& area) {
+#if defined(LQ_HAVE_SSSE3)
+    if constexpr (InStep == 3 && OutStep == 3 && c0 == 2 && c2 == 0 && !alpha) {
+        if (haveSsse3Cpu()) {
+            for (int y = area.top; y < area.bottom; ++y)
+                swapRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+            return;
+        }
+    }
+#endif
     constexpr int c1 = 1;
     forEachPixel<unsigned char, unsigned char, InStep, OutStep>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         const unsigned char a = p[c0], b = p[c1], c = p[c2];
@@ -260,6 +369,15 @@ void reorder(const Image& source, Image& target, const BaseRect<int>& area) {
 }
 template <int OutStep, bool alpha>
 void spread(const Image& source, Image& target, const BaseRect<int>& area) {
+#if defined(LQ_HAVE_SSSE3)
+    if constexpr (OutStep == 3) {
+        if (haveSsse3Cpu()) {
+            for (int y = area.top; y < area.bottom; ++y)
+                spreadRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+            return;
+        }
+    }
+#endif
     forEachPixel<unsigned char, unsigned char, 1, OutStep>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         q[0] = q[1] = q[2] = p[0];
         if (alpha) q[OutStep - 1] = 255;

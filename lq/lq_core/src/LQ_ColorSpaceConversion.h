@@ -66,6 +66,14 @@ void lumaRowNeon(const unsigned char* in, unsigned char* out, int width, int ste
 #if defined(LQ_HAVE_SSSE3)
 // three-byte pixels; r is 0 or 2; needs SSSE3
 void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+// the same, 32 pixels a step; needs AVX2
+void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
+// byte c of each three-byte pixel
+void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c);
+// each byte into a three-byte pixel
+void spreadRowSse(const unsigned char* in, unsigned char* out, int width);
+// bytes 0 and 2 of each three-byte pixel exchanged; in and out must not overlap
+void swapRowSse(const unsigned char* in, unsigned char* out, int width);
 #endif
 
 }  // namespace LQ
