@@ -91,6 +91,26 @@ TEST(Resize, BilinearAndNearestSampling) {
     EXPECT_EQ(out.pixel(1, 2)[0], mid(2, 4));
     EXPECT_EQ(out.pixel(3, 0)[0], mid(6, 0));
 
+    // every pixel against the formula, for shrinking and growing, on a wide image so that
+    // whole vector steps are taken
+    const Image wide = randomImage(83, 9, LQ::COLOR_MODE_MONO, 12);
+    for (float scale : {0.3f, 0.7f, 1.6f, 2.3f}) {
+        LQ::resizeImageBilinear(wide, out, scale, Rect());
+        const float stable = 1.000001f;
+        const int tw = out.width(), th = out.height();
+        int origin = 0, step = std::min((82 * 256) / (tw - 1), (8 * 256) / (th - 1));
+        if (scale < 1) origin = static_cast<int>(128 / scale * stable) - 128, step = static_cast<int>(256 / scale * stable);
+        for (int y = 0; y < th; ++y)
+            for (int x = 0; x < tw; ++x) {
+                const int px = origin + x * step, py = origin + y * step;
+                const int ix = std::min(px >> 8, 82), iy = std::min(py >> 8, 8), fx = px & 255, fy = py & 255;
+                const auto at = [&](int i, int j) { return int(wide.pixel(std::min(i, 82), std::min(j, 8))[0]); };
+                const int top = ((256 - fx) * at(ix, iy) + fx * at(ix + 1, iy)) >> 8;
+                const int bottom = ((256 - fx) * at(ix, iy + 1) + fx * at(ix + 1, iy + 1)) >> 8;
+                ASSERT_EQ(out.pixel(x, y)[0], ((256 - fy) * top + fy * bottom) >> 8) << scale << ": " << x << "," << y;
+            }
+    }
+
     LQ::resizeImageNn(ramp(9, 7, LQ::COLOR_MODE_BGR), out, 0.5f, Rect());
     EXPECT_EQ(out.size(), Size(4, 3));
     EXPECT_EQ(out.pixel(3, 2)[1], 100 + 46);

@@ -214,6 +214,115 @@ void zoomImageIntegral(const Image& integral, Image& target, float zoom, BaseRec
 
 // ---- bilinear and nearest ------------------------------------------------------------------
 
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+// Byte images, eight target columns a step. Per step one 16-byte load from the row holds
+// both neighbours of all eight columns when they lie close enough together (a scale
+// above about 0.6); byte shuffles made once per call pick them out into 16-bit lanes. All
+// sums fit 16 bits: (256 - f) a + f b is at most 256 x 255.
+struct Lanes {
+    alignas(16) unsigned char bytes[16];
+};
+struct MonoBlocks {
+    std::vector<int> base;  // first byte of each step's load
+    std::vector<Lanes> left, right, fraction;
+    int count = 0;                         // whole steps from the rectangle's left edge
+};
+
+__attribute__((target("ssse3"))) MonoBlocks monoBlocks(const std::vector<int>& left, const std::vector<int>& right,
+                                                      const std::vector<int>& fraction, int rowBytes) {
+    MonoBlocks blocks;
+    const int columns = static_cast<int>(left.size());
+    for (int k = 0; k + 8 <= columns; k += 8) {
+        const int base = left[k];
+        if (right[k + 7] - base >= 16 || base + 16 > rowBytes) break;
+        Lanes a, b, f;
+        for (int j = 0; j < 8; ++j) {
+            a.bytes[2 * j] = static_cast<unsigned char>(left[k + j] - base), a.bytes[2 * j + 1] = 0x80;
+            b.bytes[2 * j] = static_cast<unsigned char>(right[k + j] - base), b.bytes[2 * j + 1] = 0x80;
+            f.bytes[2 * j] = static_cast<unsigned char>(fraction[k + j]), f.bytes[2 * j + 1] = 0;
+        }
+        blocks.base.push_back(base);
+        blocks.left.push_back(a);
+        blocks.right.push_back(b);
+        blocks.fraction.push_back(f);
+        blocks.count += 8;
+    }
+    return blocks;
+}
+
+__attribute__((target("ssse3"))) inline __m128i across(const unsigned char* row, const MonoBlocks& blocks, int k) {
+    const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row + blocks.base[k]));
+    const auto lanes = [](const Lanes& l) { return _mm_load_si128(reinterpret_cast<const __m128i*>(l.bytes)); };
+    const __m128i a = _mm_shuffle_epi8(v, lanes(blocks.left[k])), b = _mm_shuffle_epi8(v, lanes(blocks.right[k]));
+    const __m128i f = lanes(blocks.fraction[k]);
+    const __m128i sum = _mm_add_epi16(_mm_mullo_epi16(_mm_sub_epi16(_mm_set1_epi16(256), f), a), _mm_mullo_epi16(f, b));
+    return _mm_srli_epi16(sum, 8);
+}
+
+// the whole steps of one target row; returns how many columns were done
+__attribute__((target("ssse3"))) int bilinearMonoRowSse(const unsigned char* upper, const unsigned char* lower,
+                                                        const MonoBlocks& blocks, int fy, unsigned char* out) {
+    const __m128i down = _mm_set1_epi16(static_cast<short>(fy)), up = _mm_set1_epi16(static_cast<short>(256 - fy));
+    for (int k = 0; k < blocks.count / 8; k += 2) {
+        __m128i result[2] = {_mm_setzero_si128(), _mm_setzero_si128()};
+        for (int h = 0; h < 2 && k + h < blocks.count / 8; ++h) {
+            const __m128i top = across(upper, blocks, k + h), bottom = across(lower, blocks, k + h);
+            result[h] = _mm_srli_epi16(_mm_add_epi16(_mm_mullo_epi16(up, top), _mm_mullo_epi16(down, bottom)), 8);
+        }
+        const __m128i packed = _mm_packus_epi16(result[0], result[1]);
+        if (k + 1 < blocks.count / 8)
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 8 * k), packed);
+        else
+            _mm_storel_epi64(reinterpret_cast<__m128i*>(out + 8 * k), packed);
+    }
+    return blocks.count;
+}
+
+bool haveSsse3ForResize() {
+    static const bool have = __builtin_cpu_supports("ssse3");
+    return have;
+}
+}  // namespace
+#endif
+
+namespace {
+// Rows of the bilinear resize: each row's two source rows are first interpolated across,
+// truncated to 8 bits, into two row buffers, then the buffers are blended down.
+template <int D>
+void bilinearRows(const Image& source, Image& target, const BaseRect<int>& targetRect, int origin, int step,
+                  const std::vector<int>& left, const std::vector<int>& right, const std::vector<int>& fraction) {
+    const int H = source.height();
+    const int columns = targetRect.width();
+    std::vector<int> top(columns * D), bottom(columns * D);
+#if defined(LQ_HAVE_SSSE3)
+    MonoBlocks blocks;
+    if (D == 1 && haveSsse3ForResize()) blocks = monoBlocks(left, right, fraction, source.width());
+#endif
+    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
+        const int py = origin + y * step;
+        const int iy = std::min(py >> 8, H - 1);
+        const int fy = py & 255;
+        const unsigned char* upper = source.row(iy);
+        const unsigned char* lower = source.row(std::min(iy + 1, H - 1));
+        unsigned char* out = target.pixel(targetRect.left, y);
+        int start = 0;
+#if defined(LQ_HAVE_SSSE3)
+        if (D == 1 && blocks.count) start = bilinearMonoRowSse(upper, lower, blocks, fy, out);
+#endif
+        for (int i = start; i < columns; ++i) {
+            const int fx = fraction[i], l = left[i], r = right[i];
+            for (int c = 0; c < D; ++c) {
+                top[i * D + c] = ((256 - fx) * upper[l + c] + fx * upper[r + c]) >> 8;
+                bottom[i * D + c] = ((256 - fx) * lower[l + c] + fx * lower[r + c]) >> 8;
+            }
+        }
+        for (int i = start * D; i < columns * D; ++i)
+            out[i] = static_cast<unsigned char>(((256 - fy) * top[i] + fy * bottom[i]) >> 8);
+    }
+}
+}  // namespace
+
 void resizeImageBilinear(const Image& source, Image& target, float scale, BaseRect<int> targetRect) {
     const ColorMode mode = source.colorMode();
     LQ_ASSERT_MSG(mode == COLOR_MODE_MONO || mode == COLOR_MODE_DEPTH || isColor(mode),
@@ -257,21 +366,11 @@ void resizeImageBilinear(const Image& source, Image& target, float scale, BaseRe
         right[i] = std::min(ix + 1, W - 1) * depth;
         fraction[i] = px & 255;
     }
-    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
-        const int py = origin + y * step;
-        const int iy = std::min(py >> 8, H - 1);
-        const int fy = py & 255;
-        const unsigned char* upper = source.row(iy);
-        const unsigned char* lower = source.row(std::min(iy + 1, H - 1));
-        unsigned char* out = target.pixel(targetRect.left, y);
-        for (int i = 0; i < columns; ++i) {
-            const int fx = fraction[i];
-            for (int c = 0; c < depth; ++c) {
-                const int top = ((256 - fx) * upper[left[i] + c] + fx * upper[right[i] + c]) >> 8;
-                const int bottom = ((256 - fx) * lower[left[i] + c] + fx * lower[right[i] + c]) >> 8;
-                out[i * depth + c] = static_cast<unsigned char>(((256 - fy) * top + fy * bottom) >> 8);
-            }
-        }
+    switch (depth) {
+        case 1: bilinearRows<1>(source, target, targetRect, origin, step, left, right, fraction); break;
+        case 3: bilinearRows<3>(source, target, targetRect, origin, step, left, right, fraction); break;
+        case 4: bilinearRows<4>(source, target, targetRect, origin, step, left, right, fraction); break;
+        default: bilinearRows<2>(source, target, targetRect, origin, step, left, right, fraction); break;
     }
 }
 
