@@ -101,6 +101,32 @@ TEST(VectorKernels, X86RowsEqualScalarRows) {
     if (__builtin_cpu_supports("avx2"))
         compareLuma([](const unsigned char* in, unsigned char* out, int width, int, int r) { LQ::lumaRowAvx2(in, out, width, r); }, 3);
 
+    // YUV and RGB both ways: the rows against the conversions' own plain pixel loops
+    for (int width = 1; width <= 67; ++width) {
+        for (int r : {0, 2}) {
+            const LQ::Image pixels = randomImage(width, 1, LQ::COLOR_MODE_YUV, width);
+            LQ::Image reference, rgb(pixels.size(), LQ::COLOR_MODE_RGB), wide(pixels.size(), LQ::COLOR_MODE_RGB);
+            LQ::yuvToRgba(pixels, reference, LQ::Rect());  // four-byte pixels take the plain loop
+            LQ::yuvToRgbRowSse(pixels.data(), rgb.data(), width, r);
+            if (__builtin_cpu_supports("avx2")) {
+                LQ::yuvToRgbRowAvx2(pixels.data(), wide.data(), width, r);
+                ASSERT_TRUE(samePixels(wide, rgb)) << width;
+            }
+            for (int x = 0; x < width; ++x) {
+                ASSERT_EQ(rgb.pixel(x, 0)[r], reference.pixel(x, 0)[0]) << width;
+                ASSERT_EQ(rgb.pixel(x, 0)[1], reference.pixel(x, 0)[1]) << width;
+                ASSERT_EQ(rgb.pixel(x, 0)[2 - r], reference.pixel(x, 0)[2]) << width;
+            }
+            // and back, against the four-byte source, which takes the plain loop
+            LQ::Image rgba(pixels.size(), LQ::COLOR_MODE_RGBA), yuv(pixels.size(), LQ::COLOR_MODE_YUV), expected;
+            for (int x = 0; x < width; ++x)
+                for (int c = 0; c < 3; ++c) rgba.pixel(x, 0)[c] = rgb.pixel(x, 0)[c == 0 ? r : (c == 2 ? 2 - r : 1)];
+            LQ::rgbaToYuv(rgba, expected, LQ::Rect());
+            LQ::rgbToYuvRowSse(rgb.data(), yuv.data(), width, r);
+            ASSERT_TRUE(samePixels(yuv, expected)) << width;
+        }
+    }
+
     // the byte moves of the colour conversions, against their plain loops
     std::mt19937 random(19);
     for (int width = 1; width <= 67; ++width) {

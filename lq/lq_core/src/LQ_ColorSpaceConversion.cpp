@@ -29,6 +29,17 @@ inline unsigned char clampByte(float value) {
     return static_cast<unsigned char>(value);
 }
 
+#if defined(LQ_HAVE_SSSE3)
+bool haveSsse3Cpu() {
+    static const bool have = __builtin_cpu_supports("ssse3");
+    return have;
+}
+bool haveAvx2Cpu() {
+    static const bool have = __builtin_cpu_supports("avx2");
+    return have;
+}
+#endif
+
 // Calls f(in, out) for each pixel of area; in and out point at the pixel's elements. The
 // pixel sizes are constants so that the loop unrolls and vectorises.
 template <class In, class Out, int InElements, int OutElements, class F>
@@ -43,6 +54,15 @@ void forEachPixel(const Image& source, Image& target, const BaseRect<int>& area,
 
 template <int Step, int r, int b>
 void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area) {
+#if defined(LQ_HAVE_SSSE3)
+    if constexpr (Step == 3) {
+        if (haveSsse3Cpu()) {
+            for (int y = area.top; y < area.bottom; ++y)
+                rgbToYuvRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
+            return;
+        }
+    }
+#endif
     constexpr int g = 1;
     forEachPixel<unsigned char, unsigned char, Step, 3>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         q[0] = luma(p[r], p[g], p[b]);
@@ -53,6 +73,19 @@ void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area) {
 
 template <int Step, int r, int b, int a>
 void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area) {
+#if defined(LQ_HAVE_SSSE3)
+    if constexpr (Step == 3) {
+        if (haveSsse3Cpu()) {
+            for (int y = area.top; y < area.bottom; ++y) {
+                if (haveAvx2Cpu())
+                    yuvToRgbRowAvx2(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
+                else
+                    yuvToRgbRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
+            }
+            return;
+        }
+    }
+#endif
     constexpr int g = 1;
     forEachPixel<unsigned char, unsigned char, 3, Step>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
         const float y = p[0], u = p[1] - 128.f, v = p[2] - 128.f;
@@ -63,16 +96,6 @@ void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area) {
     });
 }
 
-#if defined(LQ_HAVE_SSSE3)
-bool haveSsse3Cpu() {
-    static const bool have = __builtin_cpu_supports("ssse3");
-    return have;
-}
-bool haveAvx2Cpu() {
-    static const bool have = __builtin_cpu_supports("avx2");
-    return have;
-}
-#endif
 
 // Luma of a rectangle; the vector rows where the pixel layout allows them.
 void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b) {
@@ -213,6 +236,152 @@ __attribute__((target("avx2"))) void lumaRowAvx2(const unsigned char* in, unsign
         _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_packus_epi16(low, high));
     }
     lumaRowSse(in + 3 * x, out + x, width - x, r);
+}
+
+namespace {
+// pshufb masks that place channel c's bytes into the three 16-byte parts of 16 pixels
+struct Interleave3 {
+    alignas(16) signed char masks[3][3][16];
+    Interleave3() {
+        for (int c = 0; c < 3; ++c)
+            for (int part = 0; part < 3; ++part)
+                for (int i = 0; i < 16; ++i) {
+                    const int at = 16 * part + i;
+                    masks[c][part][i] = static_cast<signed char>(at % 3 == c ? at / 3 : -128);
+                }
+    }
+};
+const Interleave3 kInterleave3;
+
+__attribute__((target("ssse3"))) inline void storePixels(unsigned char* out, const __m128i* channels) {
+    for (int part = 0; part < 3; ++part) {
+        __m128i bytes = _mm_setzero_si128();
+        for (int c = 0; c < 3; ++c)
+            bytes = _mm_or_si128(bytes, _mm_shuffle_epi8(channels[c], _mm_load_si128(reinterpret_cast<const __m128i*>(
+                                                                           kInterleave3.masks[c][part]))));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 16 * part), bytes);
+    }
+}
+
+__attribute__((target("ssse3"))) inline void loadPixels(const unsigned char* in, __m128i* channels) {
+    const __m128i parts[3] = {_mm_loadu_si128(reinterpret_cast<const __m128i*>(in)),
+                              _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 16)),
+                              _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 32))};
+    for (int c = 0; c < 3; ++c) channels[c] = channel(parts, c);
+}
+
+// one float channel of four pixels clamped to 0 .. 255 and truncated, as clampByte does
+__attribute__((target("ssse3"))) inline __m128i clampTruncate(__m128 value) {
+    return _mm_cvttps_epi32(_mm_min_ps(_mm_max_ps(value, _mm_setzero_ps()), _mm_set1_ps(255.f)));
+}
+
+// ((a x + b y + c z) >> 8) + add on 16-bit lanes; the sums stay within 16 bits signed
+__attribute__((target("ssse3"))) inline __m128i weighted(__m128i x, __m128i y, __m128i z, short a, short b, short c,
+                                                         short add) {
+    const __m128i sum = _mm_add_epi16(_mm_add_epi16(_mm_mullo_epi16(x, _mm_set1_epi16(a)), _mm_mullo_epi16(y, _mm_set1_epi16(b))),
+                                      _mm_mullo_epi16(z, _mm_set1_epi16(c)));
+    return _mm_add_epi16(_mm_srai_epi16(sum, 8), _mm_set1_epi16(add));
+}
+}  // namespace
+
+__attribute__((target("ssse3"))) void yuvToRgbRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
+    const __m128i zero = _mm_setzero_si128();
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        __m128i yuv[3];
+        loadPixels(in + 3 * x, yuv);
+        __m128i words[3][2];
+        for (int c = 0; c < 3; ++c) words[c][0] = _mm_unpacklo_epi8(yuv[c], zero), words[c][1] = _mm_unpackhi_epi8(yuv[c], zero);
+        __m128i rgb[3][4];
+        for (int q = 0; q < 4; ++q) {
+            const auto lanes = [&](int c) {
+                const __m128i w = words[c][q / 2];
+                return _mm_cvtepi32_ps(q % 2 ? _mm_unpackhi_epi16(w, zero) : _mm_unpacklo_epi16(w, zero));
+            };
+            const __m128 y = lanes(0), u = _mm_sub_ps(lanes(1), _mm_set1_ps(128.f)), v = _mm_sub_ps(lanes(2), _mm_set1_ps(128.f));
+            rgb[0][q] = clampTruncate(_mm_add_ps(y, _mm_mul_ps(v, _mm_set1_ps(1.370705f))));
+            rgb[1][q] = clampTruncate(_mm_add_ps(_mm_add_ps(y, _mm_mul_ps(v, _mm_set1_ps(-0.698001f))),
+                                                 _mm_mul_ps(u, _mm_set1_ps(-0.337633f))));
+            rgb[2][q] = clampTruncate(_mm_add_ps(y, _mm_mul_ps(u, _mm_set1_ps(1.732446f))));
+        }
+        __m128i channels[3];
+        for (int c = 0; c < 3; ++c)
+            channels[c] = _mm_packus_epi16(_mm_packs_epi32(rgb[c][0], rgb[c][1]), _mm_packs_epi32(rgb[c][2], rgb[c][3]));
+        // red goes to byte r, blue to byte 2 - r
+        const __m128i ordered[3] = {channels[r == 0 ? 0 : 2], channels[1], channels[r == 0 ? 2 : 0]};
+        storePixels(out + 3 * x, ordered);
+    }
+    for (; x < width; ++x) {
+        const float y = in[3 * x], u = in[3 * x + 1] - 128.f, v = in[3 * x + 2] - 128.f;
+        out[3 * x + r] = clampByte(y + v * 1.370705f);
+        out[3 * x + 1] = clampByte(y + v * -0.698001f + u * -0.337633f);
+        out[3 * x + 2 - r] = clampByte(y + u * 1.732446f);
+    }
+}
+
+namespace {
+__attribute__((target("avx2"))) inline __m256i clampTruncate8(__m256 value) {
+    return _mm256_cvttps_epi32(_mm256_min_ps(_mm256_max_ps(value, _mm256_setzero_ps()), _mm256_set1_ps(255.f)));
+}
+// bytes 0..7 (half 0) or 8..15 (half 1) as floats
+__attribute__((target("avx2"))) inline __m256 floats8(__m128i bytes, int half) {
+    return _mm256_cvtepi32_ps(_mm256_cvtepu8_epi32(half ? _mm_srli_si128(bytes, 8) : bytes));
+}
+// eight 32-bit lanes to eight 16-bit lanes, in order
+__attribute__((target("avx2"))) inline __m128i narrow8(__m256i v) {
+    return _mm_packs_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1));
+}
+}  // namespace
+
+// the same as the SSSE3 row, with the float work eight pixels wide
+__attribute__((target("avx2"))) void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        __m128i yuv[3];
+        loadPixels(in + 3 * x, yuv);
+        __m128i rgb[3][2];
+        for (int h = 0; h < 2; ++h) {
+            const __m256 y = floats8(yuv[0], h), u = _mm256_sub_ps(floats8(yuv[1], h), _mm256_set1_ps(128.f)),
+                         v = _mm256_sub_ps(floats8(yuv[2], h), _mm256_set1_ps(128.f));
+            rgb[0][h] = narrow8(clampTruncate8(_mm256_add_ps(y, _mm256_mul_ps(v, _mm256_set1_ps(1.370705f)))));
+            rgb[1][h] = narrow8(clampTruncate8(_mm256_add_ps(_mm256_add_ps(y, _mm256_mul_ps(v, _mm256_set1_ps(-0.698001f))),
+                                                             _mm256_mul_ps(u, _mm256_set1_ps(-0.337633f)))));
+            rgb[2][h] = narrow8(clampTruncate8(_mm256_add_ps(y, _mm256_mul_ps(u, _mm256_set1_ps(1.732446f)))));
+        }
+        __m128i channels[3];
+        for (int c = 0; c < 3; ++c) channels[c] = _mm_packus_epi16(rgb[c][0], rgb[c][1]);
+        const __m128i ordered[3] = {channels[r == 0 ? 0 : 2], channels[1], channels[r == 0 ? 2 : 0]};
+        storePixels(out + 3 * x, ordered);
+    }
+    yuvToRgbRowSse(in + 3 * x, out + 3 * x, width - x, r);
+}
+
+__attribute__((target("ssse3"))) void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
+    const __m128i zero = _mm_setzero_si128();
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        __m128i pixels[3];
+        loadPixels(in + 3 * x, pixels);
+        const __m128i red = pixels[r], green = pixels[1], blue = pixels[2 - r];
+        __m128i yuv[3][2];
+        for (int h = 0; h < 2; ++h) {
+            const __m128i R = h ? _mm_unpackhi_epi8(red, zero) : _mm_unpacklo_epi8(red, zero);
+            const __m128i G = h ? _mm_unpackhi_epi8(green, zero) : _mm_unpacklo_epi8(green, zero);
+            const __m128i B = h ? _mm_unpackhi_epi8(blue, zero) : _mm_unpacklo_epi8(blue, zero);
+            yuv[0][h] = luma8Sse(R, G, B);
+            yuv[1][h] = weighted(R, G, B, -38, -74, 112, 128);
+            yuv[2][h] = weighted(R, G, B, 112, -94, -18, 128);
+        }
+        __m128i channels[3];
+        for (int c = 0; c < 3; ++c) channels[c] = _mm_packus_epi16(yuv[c][0], yuv[c][1]);
+        storePixels(out + 3 * x, channels);
+    }
+    for (; x < width; ++x) {
+        const unsigned char* p = in + 3 * x;
+        out[3 * x] = luma(p[r], p[1], p[2 - r]);
+        out[3 * x + 1] = chromaU(p[r], p[1], p[2 - r]);
+        out[3 * x + 2] = chromaV(p[r], p[1], p[2 - r]);
+    }
 }
 
 __attribute__((target("ssse3"))) void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c) {

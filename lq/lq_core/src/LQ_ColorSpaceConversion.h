@@ -68,6 +68,10 @@ void lumaRowNeon(const unsigned char* in, unsigned char* out, int width, int ste
 void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r);
 // the same, 32 pixels a step; needs AVX2
 void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
+// YUV to three-byte RGB (red at byte r) and back, 16 pixels a step; need SSSE3
+void yuvToRgbRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
 // byte c of each three-byte pixel
 void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c);
 // each byte into a three-byte pixel

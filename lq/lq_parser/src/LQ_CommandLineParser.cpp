@@ -12,15 +12,19 @@ namespace LQ {
 
 namespace {
 bool warningsSuppressed = false;
-// an option file that imports itself would otherwise recurse without end
-constexpr int kMaxImportDepth = 16;
 
-std::vector<std::string> parseStream(std::istream& stream, int depth);
+const char* typeWord(int type) {
+    switch (type & 15) {
+        case ValueType::STRING: return "STRING";
+        case ValueType::INT: return "INT";
+        case ValueType::FLOAT: return "FLOAT";
+        case ValueType::BOOL: return "BOOL";
+        default: return "";
+    }
+}
+}  // namespace
 
-// Joins tokens that belong together: a quoted value with blanks, or a braced one.
-std::vector<std::string> fixArgs(const std::vector<std::string>& tokens, int depth);
-
-std::vector<std::string> replaceImport(const std::vector<std::string>& tokens, int depth) {
+std::vector<std::string> CommandLineParser::replaceImport(const std::vector<std::string>& tokens, int depth) {
     std::vector<std::string> result;
     for (size_t i = 0; i < tokens.size(); ++i) {
         std::string fileName;
@@ -36,14 +40,15 @@ std::vector<std::string> replaceImport(const std::vector<std::string>& tokens, i
         }
         std::ifstream file(fileName.c_str());
         LQ_ASSERT_MSG(file.is_open(), "can't open file " << fileName);
-        LQ_ASSERT_MSG(depth < kMaxImportDepth, "imports nested deeper than " << kMaxImportDepth << ": " << fileName);
+        LQ_ASSERT_MSG(depth < maxImportDepth,
+                      "imports nested deeper than " << maxImportDepth << " files, a loop? at " << fileName);
         const std::vector<std::string> imported = parseStream(file, depth + 1);
         result.insert(result.end(), imported.begin(), imported.end());
     }
     return result;
 }
 
-std::vector<std::string> fixArgs(const std::vector<std::string>& tokens, int depth) {
+std::vector<std::string> CommandLineParser::fixArgs(const std::vector<std::string>& tokens, int depth) {
     std::vector<std::string> joined;
     for (size_t i = 0; i < tokens.size(); ++i) {
         std::string arg = tokens[i];
@@ -53,6 +58,7 @@ std::vector<std::string> fixArgs(const std::vector<std::string>& tokens, int dep
                 arg += " " + tokens[++i];
             LQ_ASSERT_MSG(arg.back() == '"', "Closing '\"' isn't found: " << arg);
         } else if (arg.find('{') != std::string::npos) {
+            // no nesting: the first token that ends in "}" closes the value
             while (arg.back() != '}' && i + 1 < tokens.size()) arg += " " + tokens[++i];
             LQ_ASSERT_MSG(arg.back() == '}', "Closing } isn't found: " << arg);
         }
@@ -61,7 +67,7 @@ std::vector<std::string> fixArgs(const std::vector<std::string>& tokens, int dep
     return replaceImport(joined, depth);
 }
 
-std::vector<std::string> parseStream(std::istream& stream, int depth) {
+std::vector<std::string> CommandLineParser::parseStream(std::istream& stream, int depth) {
     std::vector<std::string> tokens;
     std::string token;
     while (stream >> token) {
@@ -72,32 +78,6 @@ std::vector<std::string> parseStream(std::istream& stream, int depth) {
         tokens.push_back(token);
     }
     return fixArgs(tokens, depth);
-}
-
-const char* typeWord(int type) {
-    switch (type & 15) {
-        case ValueType::STRING: return "STRING";
-        case ValueType::INT: return "INT";
-        case ValueType::FLOAT: return "FLOAT";
-        case ValueType::BOOL: return "BOOL";
-        default: return "";
-    }
-}
-}  // namespace
-
-int countChars(const std::string& text, char character) {
-    int count = 0;
-    for (char c : text) count += c == character;
-    return count;
-}
-
-void trim(std::string& text, const std::string& characters) {
-    const size_t first = text.find_first_not_of(characters);
-    if (first != std::string::npos) {
-        const size_t last = text.find_last_not_of(characters);
-        text = text.substr(first, last - first + 1);
-    }
-    if (text.size() >= 2 && text.front() == '"' && text.back() == '"') text = text.substr(1, text.size() - 2);
 }
 
 std::string getRawValue(const std::string& text) {
@@ -115,7 +95,7 @@ std::string getRawValue(const std::string& text) {
 
 void parseString(const std::string& text, std::vector<std::pair<std::string, std::string>>& pairs) {
     std::istringstream stream(text);
-    const std::vector<std::string> tokens = parseStream(stream, 0);
+    const std::vector<std::string> tokens = CommandLineParser::parseStream(stream);
     for (size_t i = 0; i < tokens.size(); ++i) {
         const std::string& token = tokens[i];
         LQ_ASSERT_MSG(token[0] == '-', "cannot find key in " << text);
@@ -167,18 +147,18 @@ void CommandLineParser::setDefaultValue(const std::string& longKey, const std::s
 void CommandLineParser::parse(int argc, const char* const* argv) {
     std::vector<std::string> tokens;
     for (int i = 1; i < argc; ++i) tokens.push_back(argv[i]);
-    args_ = fixArgs(tokens, 0);
+    args_ = fixArgs(tokens);
     parseBase(args_);
 }
 
 void CommandLineParser::parse(const std::vector<std::string>& tokens) {
-    args_ = fixArgs(tokens, 0);
+    args_ = fixArgs(tokens);
     parseBase(args_);
 }
 
 void CommandLineParser::parse(const std::string& text) {
     std::istringstream stream(text);
-    args_ = parseStream(stream, 0);
+    args_ = parseStream(stream);
     parseBase(args_);
 }
 
@@ -188,7 +168,7 @@ void CommandLineParser::import(const std::string& fileName) {
     import(file);
 }
 
-void CommandLineParser::import(std::istream& stream) { parse(parseStream(stream, 0)); }
+void CommandLineParser::import(std::istream& stream) { parse(parseStream(stream)); }
 
 bool CommandLineParser::findRecognizedKey(const std::vector<std::string>& args, size_t& position) {
     for (; position < args.size(); ++position) {
@@ -207,6 +187,15 @@ void CommandLineParser::insertArgument(unsigned int index) {
     if (required != requiredKeys_.end()) required->second = true;
 }
 
+bool CommandLineParser::readArguments(const std::vector<std::string>& args, size_t position, unsigned int index) {
+    for (unsigned int k = 1; k <= keysInfo_[index].argumentsCount; ++k) {
+        const std::string& token = args[position + k];
+        if (keyIndex_.count(token)) return false;
+        values_[index] = token;
+    }
+    return true;
+}
+
 void CommandLineParser::parseBase(const std::vector<std::string>& args) {
     size_t i = 0;
     while (i < args.size()) {
@@ -220,11 +209,8 @@ void CommandLineParser::parseBase(const std::vector<std::string>& args) {
             insertArgument(index);
             LQ_ASSERT_MSG(i + info.argumentsCount < args.size(),
                           "key '" << key << "' has less than required count of arguments");
-            for (unsigned int k = 1; k <= info.argumentsCount; ++k) {
-                LQ_ASSERT_MSG(!keyIndex_.count(args[i + k]),
-                              "key '" << key << "' has less than required count of arguments");
-                values_[index] = args[i + k];
-            }
+            LQ_ASSERT_MSG(readArguments(args, i, index),
+                          "key '" << key << "' has less than required count of arguments");
             i += 1 + info.argumentsCount;
         } else {
             std::string key, value;

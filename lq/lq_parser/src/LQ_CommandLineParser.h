@@ -5,6 +5,7 @@
 #include <istream>
 #include <map>
 #include <ostream>
+#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -14,7 +15,8 @@
 namespace LQ {
 
 struct ValueType {
-    enum Value { NONE = 0, STRING = 1, INT = 2, FLOAT = 3, BOOL = 4 };
+    // a plain int underneath: callers pass the type as a number and only its low bits count
+    enum Value : int { NONE = 0, STRING = 1, INT = 2, FLOAT = 3, BOOL = 4 };
 };
 
 struct SingleKeyInfo {
@@ -71,9 +73,23 @@ public:
     static bool checkShortKey(const std::string& key);
     static bool checkLongKey(const std::string& key);
 
+    // Tokens of a text, split at white space; a token that starts with "#" drops the rest
+    // of its line. The tokens then go through fixArgs. depth counts nested imports.
+    static std::vector<std::string> parseStream(std::istream& stream, int depth = 0);
+    // Joins a quoted or braced value that blanks cut into several tokens, then resolves
+    // the imports.
+    static std::vector<std::string> fixArgs(const std::vector<std::string>& tokens, int depth = 0);
+    // "-i name" and "--import=name" replaced by the tokens of the file.
+    static std::vector<std::string> replaceImport(const std::vector<std::string>& tokens, int depth = 0);
+    // nested imports beyond this fail: a file that imports itself would never end
+    static const int maxImportDepth = 16;
+
 private:
     void parseBase(const std::vector<std::string>& args);
+    // Scans forward to a declared key; false at a "key=value" token or the end.
     bool findRecognizedKey(const std::vector<std::string>& args, size_t& position);
+    // The tokens behind the key at position into its value; false at a declared key.
+    bool readArguments(const std::vector<std::string>& args, size_t position, unsigned int index);
     void insertArgument(unsigned int index);
     void checkRequiredKeysPresence() const;
     static bool isNumeric(const std::string& text, bool allowPoint);
@@ -93,9 +109,5 @@ private:
 std::string getRawValue(const std::string& text);
 // a stand-alone tokeniser into (key, value) pairs, with no declared keys
 void parseString(const std::string& text, std::vector<std::pair<std::string, std::string>>& pairs);
-int countChars(const std::string& text, char character);
-// Cuts the characters of the set from both ends (a text made only of them stays), then
-// one pair of enclosing double quotes.
-void trim(std::string& text, const std::string& characters);
 
 }  // namespace LQ
