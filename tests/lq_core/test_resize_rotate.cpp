@@ -111,6 +111,10 @@ TEST(Resize, BilinearAndNearestSampling) {
             }
     }
 
+    LQ::resizeImageNn(wide, out, 0.5f, Rect(3, 1, 41, 4));  // half the width: every second byte
+    for (int y = 1; y < 4; ++y)
+        for (int x = 3; x < 41; ++x) ASSERT_EQ(out.pixel(x, y)[0], wide.pixel(2 * x, 2 * y)[0]) << x << "," << y;
+
     LQ::resizeImageNn(ramp(9, 7, LQ::COLOR_MODE_BGR), out, 0.5f, Rect());
     EXPECT_EQ(out.size(), Size(4, 3));
     EXPECT_EQ(out.pixel(3, 2)[1], 100 + 46);

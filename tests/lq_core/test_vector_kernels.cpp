@@ -39,7 +39,7 @@ void compareLuma(Vector vectorRow, int step) {
 template <class Vector>
 void compareHalving(Vector vectorRow) {
     std::mt19937 random(11);
-    for (int width = 1; width <= 67; ++width)
+    for (int width = 1; width <= 99; ++width)
         for (int kind = 0; kind < 3; ++kind) {
             const std::vector<unsigned char> row0 = testRow(2 * width, random, kind);
             const std::vector<unsigned char> row1 = testRow(2 * width, random, kind);
@@ -95,6 +95,7 @@ TEST(VectorKernels, X86RowsEqualScalarRows) {
     if (!__builtin_cpu_supports("ssse3")) GTEST_SKIP() << "no SSSE3 on this processor";
     compareLuma([](const unsigned char* in, unsigned char* out, int width, int, int r) { LQ::lumaRowSse(in, out, width, r); }, 3);
     compareHalving(LQ::zoomMonoTwiceRowSse);
+    if (__builtin_cpu_supports("avx2")) compareHalving(LQ::zoomMonoTwiceRowAvx2);
     compareCensus(LQ::rmctRowSse);
     compareIntegral(LQ::integralRowSse);
 

@@ -62,9 +62,42 @@ __attribute__((target("ssse3"))) void zoomMonoTwiceRowSse(const unsigned char* r
     zoomMonoTwiceRowScalar(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
 }
 
+__attribute__((target("avx2"))) void zoomMonoTwiceRowAvx2(const unsigned char* row0, const unsigned char* row1,
+                                                          unsigned char* out, int width) {
+    const __m256i ones = _mm256_set1_epi8(1);
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const auto load = [](const unsigned char* p) { return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)); };
+        const __m256i low = _mm256_add_epi16(_mm256_maddubs_epi16(load(row0 + 2 * x), ones),
+                                             _mm256_maddubs_epi16(load(row1 + 2 * x), ones));
+        const __m256i high = _mm256_add_epi16(_mm256_maddubs_epi16(load(row0 + 2 * x + 32), ones),
+                                              _mm256_maddubs_epi16(load(row1 + 2 * x + 32), ones));
+        // packing works per 128-bit lane: put the quarters back in order
+        const __m256i packed = _mm256_packus_epi16(_mm256_srli_epi16(low, 2), _mm256_srli_epi16(high, 2));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(packed, 0xD8));
+    }
+    zoomMonoTwiceRowSse(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+}
+
+// out[x] = in[2x]: the nearest resize at exactly half the width
+void evenBytesRowSse(const unsigned char* in, unsigned char* out, int width) {
+    const __m128i mask = _mm_set1_epi16(0x00FF);
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        const __m128i a = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x)), mask);
+        const __m128i b = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x + 16)), mask);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x), _mm_packus_epi16(a, b));
+    }
+    for (; x < width; ++x) out[x] = in[2 * x];
+}
+
 namespace {
 bool haveSsse3Cpu() {
     static const bool have = __builtin_cpu_supports("ssse3");
+    return have;
+}
+bool haveAvx2Cpu() {
+    static const bool have = __builtin_cpu_supports("avx2");
     return have;
 }
 }  // namespace
@@ -78,7 +111,9 @@ void zoomMonoTwice(int width, int height, const unsigned char* source, unsigned 
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
         zoomMonoTwiceRowNeon(row0, row0 + sourceStride, out, width);
 #elif defined(LQ_HAVE_SSSE3)
-        if (haveSsse3Cpu())
+        if (haveAvx2Cpu())
+            zoomMonoTwiceRowAvx2(row0, row0 + sourceStride, out, width);
+        else if (haveSsse3Cpu())
             zoomMonoTwiceRowSse(row0, row0 + sourceStride, out, width);
         else
             zoomMonoTwiceRowScalar(row0, row0 + sourceStride, out, width);
@@ -416,11 +451,23 @@ void resizeImageNn(const Image& source, Image& target, float scale, BaseRect<int
     for (int i = 0; i < targetRect.height(); ++i)
         rows[i] = std::min(static_cast<int>((targetRect.top + i) / scale * stable), H - 1);
     switch (depth) {
-        case 1:
-            for (int y = targetRect.top; y < targetRect.bottom; ++y)
-                gatherRowScalar(source.row(rows[y - targetRect.top]), columns.data(),
-                                target.pixel(targetRect.left, y), targetRect.width());
+        case 1: {
+            // every second column from the first one: a plain stride, no table
+            bool everySecond = true;
+            for (int i = 1; i < targetRect.width() && everySecond; ++i) everySecond = columns[i] == columns[0] + 2 * i;
+            for (int y = targetRect.top; y < targetRect.bottom; ++y) {
+                const unsigned char* in = source.row(rows[y - targetRect.top]);
+                unsigned char* out = target.pixel(targetRect.left, y);
+#if defined(LQ_HAVE_SSSE3)
+                if (everySecond) {
+                    evenBytesRowSse(in + columns[0], out, targetRect.width());
+                    continue;
+                }
+#endif
+                gatherRowScalar(in, columns.data(), out, targetRect.width());
+            }
             break;
+        }
         case 2: gatherPixels<2>(source, target, targetRect, columns, rows); break;
         case 3: gatherPixels<3>(source, target, targetRect, columns, rows); break;
         default: gatherPixels<4>(source, target, targetRect, columns, rows); break;
