@@ -2,6 +2,7 @@
 // Gradient operators over mono images: Sobel, Roberts cross, direction sectors, Canny.
 
 #include "LQ_Image.h"
+#include "LQ_Neon.h"
 
 namespace LQ {
 
@@ -18,5 +19,20 @@ void computeGradients(const Image& source, Image& target);
 void thinGradients(Image& image);
 void updateGradients(unsigned char* pixel, int low, int stripLength);
 void canny(const Image& source, Image& target, int minThreshold, int maxThreshold);
+
+// Row kernels, exposed so the vector paths can be compared with the scalar one: Gx / 8 and
+// Gy / 8 of columns 1 .. width - 2 of the row between above and below, at target[2x] and
+// target[2x + 1]; width >= 3.
+void sobelRowScalar(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
+                    signed char* target, int width);
+#if defined(LQ_HAVE_NEON)
+void sobelRowNeon(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
+                  signed char* target, int width);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// SSE2, which every x86-64 processor has
+void sobelRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
+                 signed char* target, int width);
+#endif
 
 }  // namespace LQ

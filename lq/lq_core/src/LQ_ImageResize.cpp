@@ -67,11 +67,10 @@ __attribute__((target("avx2"))) void zoomMonoTwiceRowAvx2(const unsigned char* r
     const __m256i ones = _mm256_set1_epi8(1);
     int x = 0;
     for (; x + 32 <= width; x += 32) {
-        const auto load = [](const unsigned char* p) { return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)); };
-        const __m256i low = _mm256_add_epi16(_mm256_maddubs_epi16(load(row0 + 2 * x), ones),
-                                             _mm256_maddubs_epi16(load(row1 + 2 * x), ones));
-        const __m256i high = _mm256_add_epi16(_mm256_maddubs_epi16(load(row0 + 2 * x + 32), ones),
-                                              _mm256_maddubs_epi16(load(row1 + 2 * x + 32), ones));
+        const __m256i low = _mm256_add_epi16(_mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row0 + 2 * x)), ones),
+                                             _mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row1 + 2 * x)), ones));
+        const __m256i high = _mm256_add_epi16(_mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row0 + 2 * x + 32)), ones),
+                                              _mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row1 + 2 * x + 32)), ones));
         // packing works per 128-bit lane: put the quarters back in order
         const __m256i packed = _mm256_packus_epi16(_mm256_srli_epi16(low, 2), _mm256_srli_epi16(high, 2));
         _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(packed, 0xD8));

@@ -173,51 +173,64 @@ const unsigned char* getHogSigned12() { return tables().signed12.data(); }
 
 // ---- integral HOG -------------------------------------------------------------------------------
 
-void computeIntegralHog(const unsigned char* data, int stripLength, Image& target, const BaseRect<int>& rect,
-                        ColorMode mode) {
-    int bins = 0;
-    const unsigned char* hog = nullptr;
-    if (mode == COLOR_MODE_INTEGRAL_HOG_SIGNED12) {
-        bins = 12;
-        hog = getHogSigned12();
-    } else if (mode == COLOR_MODE_INTEGRAL_HOG_UNSIGNED6) {
-        bins = 6;
-        hog = getHogUnsigned6();
-    } else {
-        LQ_FAIL("incorrect color mode: " << mode);
-    }
+namespace {
+// The rows of an integral HOG of a W x H region, W and H at least 3. The bin count is a
+// constant so that the channel loops unroll into vector adds.
+template <int Bins>
+void integralHogRows(const unsigned char* origin, ptrdiff_t stripLength, Image& target, const unsigned char* hog, int W,
+                     int H) {
+    constexpr int channels = Bins + 1;
     const unsigned char* magnitudes = getMagnitudes();
-    const int W = rect.width(), H = rect.height();
-    target.create(BaseSize<int>(W + 1, H + 1), mode);
-    const int channels = bins + 1;
-    for (int y = 0; y <= H; ++y) std::memset(target.row(y), 0, sizeof(unsigned int) * channels * (W + 1));
-    if (W < 3 || H < 3) return;
-
-    unsigned int accumulator[13];
-    const unsigned char* origin = data + static_cast<ptrdiff_t>(rect.top) * stripLength + rect.left;
     for (int j = 1; j <= H - 2; ++j) {
-        std::memset(accumulator, 0, sizeof(accumulator));
-        const unsigned char* up = origin + static_cast<ptrdiff_t>(j - 1) * stripLength;
+        unsigned int accumulator[channels] = {};
+        const unsigned char* up = origin + (j - 1) * stripLength;
         const unsigned char* mid = up + stripLength;
         const unsigned char* down = mid + stripLength;
-        const unsigned int* previous = target.row<unsigned int>(j);
-        unsigned int* current = target.row<unsigned int>(j + 1);
-        for (int i = 1; i <= W - 2; ++i) {
+        const unsigned int* above = target.row<unsigned int>(j) + 2 * channels;
+        unsigned int* out = target.row<unsigned int>(j + 1) + 2 * channels;
+        for (int i = 1; i <= W - 2; ++i, above += channels, out += channels) {
             const int gx = down[i + 1] + up[i + 1] + 2 * (mid[i + 1] - mid[i - 1]) - down[i - 1] - up[i - 1];
             const int gy = down[i + 1] + down[i - 1] + 2 * (down[i] - up[i]) - up[i + 1] - up[i - 1];
-            const int a = gx / 4, b = gy / 4;
-            const unsigned int m = magnitudes[at(a, b)];
-            accumulator[hog[at(a, b)]] += m;
-            accumulator[bins] += m;
-            const unsigned int* above = previous + (i + 1) * channels;
-            unsigned int* out = current + (i + 1) * channels;
+            const int entry = at(gx / 4, gy / 4);
+            const unsigned int m = magnitudes[entry];
+            accumulator[hog[entry]] += m;
+            accumulator[Bins] += m;
             for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
         }
-        const unsigned int* above = previous + W * channels;
-        unsigned int* out = current + W * channels;
+        // column W repeats the last sums: the border pixel adds nothing
         for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
     }
     std::memcpy(target.row(H), target.row(H - 1), sizeof(unsigned int) * channels * (W + 1));
+}
+}  // namespace
+
+void computeIntegralHog(const unsigned char* data, int stripLength, Image& target, const BaseRect<int>& rect,
+                        ColorMode mode) {
+    int bins = 0;
+    if (mode == COLOR_MODE_INTEGRAL_HOG_SIGNED12) {
+        bins = 12;
+    } else if (mode == COLOR_MODE_INTEGRAL_HOG_UNSIGNED6) {
+        bins = 6;
+    } else {
+        LQ_FAIL("incorrect color mode: " << mode);
+    }
+    const int W = rect.width(), H = rect.height();
+    target.create(BaseSize<int>(W + 1, H + 1), mode);
+    const size_t rowBytes = sizeof(unsigned int) * (bins + 1) * (W + 1);
+    if (W < 3 || H < 3) {
+        for (int y = 0; y <= H; ++y) std::memset(target.row(y), 0, rowBytes);
+        return;
+    }
+    // Rows 2 .. H - 1 get every position written but columns 0 and 1; row H is a copy.
+    std::memset(target.row(0), 0, rowBytes);
+    std::memset(target.row(1), 0, rowBytes);
+    for (int y = 2; y < H; ++y) std::memset(target.row(y), 0, sizeof(unsigned int) * (bins + 1) * 2);
+
+    const unsigned char* origin = data + static_cast<ptrdiff_t>(rect.top) * stripLength + rect.left;
+    if (bins == 12)
+        integralHogRows<12>(origin, stripLength, target, getHogSigned12(), W, H);
+    else
+        integralHogRows<6>(origin, stripLength, target, getHogUnsigned6(), W, H);
 }
 
 void computeIntegralHog(const Image& image, Image& target, const BaseRect<int>& rect, ColorMode mode) {

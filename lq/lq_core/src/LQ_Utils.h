@@ -155,3 +155,4 @@ inline char typeChar<double>() { return 'D'; }
     } while (0)
 
 #include "LQ_Utils.inl"
+#include "LQ_StringUtils.h"

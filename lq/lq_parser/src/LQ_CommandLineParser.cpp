@@ -3,7 +3,6 @@
 #include <cstdlib>
 #include <fstream>
 #include <iostream>
-#include <limits>
 #include <sstream>
 
 #include "LQ_IniParser.h"
@@ -41,7 +40,7 @@ std::vector<std::string> CommandLineParser::replaceImport(const std::vector<std:
         std::ifstream file(fileName.c_str());
         LQ_ASSERT_MSG(file.is_open(), "can't open file " << fileName);
         LQ_ASSERT_MSG(depth < maxImportDepth,
-                      "imports nested deeper than " << maxImportDepth << " files, a loop? at " << fileName);
+                      "imports nest deeper than " << maxImportDepth << " levels at " << fileName);
         const std::vector<std::string> imported = parseStream(file, depth + 1);
         result.insert(result.end(), imported.begin(), imported.end());
     }
@@ -288,7 +287,7 @@ bool CommandLineParser::getBool(const std::string& key) const {
 std::map<std::string, std::string> CommandLineParser::getArgs() const {
     std::map<std::string, std::string> result;
     for (const auto& entry : keyIndex_) {
-        if (entry.first.find("--") == std::string::npos) continue;
+        
         const auto value = values_.find(entry.second);
         if (value != values_.end()) result[entry.first] = value->second;
     }

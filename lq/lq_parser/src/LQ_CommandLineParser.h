@@ -82,7 +82,7 @@ public:
     // "-i name" and "--import=name" replaced by the tokens of the file.
     static std::vector<std::string> replaceImport(const std::vector<std::string>& tokens, int depth = 0);
     // nested imports beyond this fail: a file that imports itself would never end
-    static const int maxImportDepth = 16;
+    static constexpr int maxImportDepth = 16;
 
 private:
     void parseBase(const std::vector<std::string>& args);
