@@ -184,3 +184,39 @@ TEST(IntegralHog, SumsOfMagnitudesPerBinAtEverySize) {
     EXPECT_EQ(check.expression, "0");
     EXPECT_EQ(check.tail, "incorrect color mode: COLOR_MODE_RMCT");
 }
+
+TEST(IntegralHog, VectorRowsEqualScalarRows) {
+    std::mt19937 random(31);
+    for (int bins : {6, 12}) {
+        const unsigned char* hog = bins == 12 ? LQ::getHogSigned12() : LQ::getHogUnsigned6();
+        const size_t channels = bins + 1;
+        for (int width = 3; width <= 67; ++width)
+            for (int kind = 0; kind < 2; ++kind) {
+                std::vector<unsigned char> rows[3];
+                for (auto& row : rows) {
+                    row = randomBytes(width, random);
+                    if (kind == 1)  // the largest magnitudes
+                        for (auto& b : row) b = b & 1 ? 255 : 0;
+                }
+                // exact-size rows, so that a vector store past the last position shows
+                std::vector<unsigned int> previous((width + 1) * channels);
+                for (auto& v : previous) v = random() % 1000000;
+                std::vector<unsigned int> expected(previous.size(), 7u);
+                LQ::integralHogRowScalar(rows[0].data(), rows[1].data(), rows[2].data(), width, hog, bins,
+                                         previous.data(), expected.data());
+                for (size_t k = 0; k < 2 * channels; ++k) ASSERT_EQ(expected[k], 7u);  // positions 0 and 1 untouched
+#if defined(LQ_HAVE_NEON)
+                std::vector<unsigned int> neon(previous.size(), 7u);
+                LQ::integralHogRowNeon(rows[0].data(), rows[1].data(), rows[2].data(), width, hog, bins,
+                                       previous.data(), neon.data());
+                ASSERT_EQ(neon, expected) << bins << " bins, width " << width;
+#endif
+#if defined(LQ_HAVE_SSSE3)
+                std::vector<unsigned int> sse(previous.size(), 7u);
+                LQ::integralHogRowSse(rows[0].data(), rows[1].data(), rows[2].data(), width, hog, bins,
+                                      previous.data(), sse.data());
+                ASSERT_EQ(sse, expected) << bins << " bins, width " << width;
+#endif
+            }
+    }
+}

@@ -75,6 +75,7 @@ TEST(CommandLineParser, FailureTexts) {
         {"-m", "key '-m' has less than required count of arguments"},
         {"-m -n", "key '-m' has less than required count of arguments"},
         {"-m=fist", "key '-m' is not a long key"},
+        {"--m=fist", "key '--m' is not a long key"},
         {"-i", "no argument to -i"},
         {"--import /nonexistent/options.txt", "can't open file "},
     };
@@ -84,6 +85,12 @@ TEST(CommandLineParser, FailureTexts) {
         EXPECT_TRUE(check.thrown) << c.text;
         EXPECT_EQ(check.tail, c.tail) << c.text;
     }
+
+    // "--import" with a blank: the split finds no "=", so the file name is empty
+    CommandLineParser blank = engineParser();
+    ::testing::internal::CaptureStderr();
+    catchCheck([&] { blank.parse("--import options.txt"); });
+    EXPECT_EQ(::testing::internal::GetCapturedStderr(), "[error] No '=' found in line '--import'\n");
 
     CommandLineParser parser = engineParser();
     parser.parse("--mode=x --scale=1.2.3 --flip=TRUE");

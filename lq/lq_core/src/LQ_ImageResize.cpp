@@ -79,6 +79,17 @@ __attribute__((target("avx2"))) void zoomMonoTwiceRowAvx2(const unsigned char* r
 }
 
 // out[x] = in[2x]: the nearest resize at exactly half the width
+__attribute__((target("avx2"))) void evenBytesRowAvx2(const unsigned char* in, unsigned char* out, int width) {
+    const __m256i mask = _mm256_set1_epi16(0x00FF);
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const __m256i a = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x)), mask);
+        const __m256i b = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x + 32)), mask);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(_mm256_packus_epi16(a, b), 0xD8));
+    }
+    evenBytesRowSse(in + 2 * x, out + x, width - x);
+}
+
 void evenBytesRowSse(const unsigned char* in, unsigned char* out, int width) {
     const __m128i mask = _mm_set1_epi16(0x00FF);
     int x = 0;
@@ -459,7 +470,10 @@ void resizeImageNn(const Image& source, Image& target, float scale, BaseRect<int
                 unsigned char* out = target.pixel(targetRect.left, y);
 #if defined(LQ_HAVE_SSSE3)
                 if (everySecond) {
-                    evenBytesRowSse(in + columns[0], out, targetRect.width());
+                    if (haveAvx2Cpu())
+                        evenBytesRowAvx2(in + columns[0], out, targetRect.width());
+                    else
+                        evenBytesRowSse(in + columns[0], out, targetRect.width());
                     continue;
                 }
 #endif

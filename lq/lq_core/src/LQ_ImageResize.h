@@ -49,6 +49,7 @@ void zoomMonoTwiceRowNeon(const unsigned char* row0, const unsigned char* row1, 
 void zoomMonoTwiceRowSse(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width);
 void zoomMonoTwiceRowAvx2(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width);
 void evenBytesRowSse(const unsigned char* in, unsigned char* out, int width);
+void evenBytesRowAvx2(const unsigned char* in, unsigned char* out, int width);
 #endif
 
 // Gathers of the nearest resize: out[x] = in[columns[x]] for pixels of 1 byte.

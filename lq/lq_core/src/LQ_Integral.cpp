@@ -174,33 +174,141 @@ const unsigned char* getHogSigned12() { return tables().signed12.data(); }
 // ---- integral HOG -------------------------------------------------------------------------------
 
 namespace {
-// The rows of an integral HOG of a W x H region, W and H at least 3. The bin count is a
-// constant so that the channel loops unroll into vector adds.
+inline int hogEntry(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int i) {
+    const int gx = down[i + 1] + up[i + 1] + 2 * (mid[i + 1] - mid[i - 1]) - down[i - 1] - up[i - 1];
+    const int gy = down[i + 1] + down[i - 1] + 2 * (down[i] - up[i]) - up[i + 1] - up[i - 1];
+    return at(gx / 4, gy / 4);
+}
+
+// The bin count is a constant so that the channel loops unroll.
 template <int Bins>
-void integralHogRows(const unsigned char* origin, ptrdiff_t stripLength, Image& target, const unsigned char* hog, int W,
-                     int H) {
+void hogRowScalar(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int width,
+                  const unsigned char* hog, const unsigned int* previous, unsigned int* current) {
     constexpr int channels = Bins + 1;
     const unsigned char* magnitudes = getMagnitudes();
-    for (int j = 1; j <= H - 2; ++j) {
-        unsigned int accumulator[channels] = {};
-        const unsigned char* up = origin + (j - 1) * stripLength;
-        const unsigned char* mid = up + stripLength;
-        const unsigned char* down = mid + stripLength;
-        const unsigned int* above = target.row<unsigned int>(j) + 2 * channels;
-        unsigned int* out = target.row<unsigned int>(j + 1) + 2 * channels;
-        for (int i = 1; i <= W - 2; ++i, above += channels, out += channels) {
-            const int gx = down[i + 1] + up[i + 1] + 2 * (mid[i + 1] - mid[i - 1]) - down[i - 1] - up[i - 1];
-            const int gy = down[i + 1] + down[i - 1] + 2 * (down[i] - up[i]) - up[i + 1] - up[i - 1];
-            const int entry = at(gx / 4, gy / 4);
-            const unsigned int m = magnitudes[entry];
-            accumulator[hog[entry]] += m;
-            accumulator[Bins] += m;
-            for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
-        }
-        // column W repeats the last sums: the border pixel adds nothing
+    unsigned int accumulator[channels] = {};
+    const unsigned int* above = previous + 2 * channels;
+    unsigned int* out = current + 2 * channels;
+    for (int i = 1; i <= width - 2; ++i, above += channels, out += channels) {
+        const int entry = hogEntry(up, mid, down, i);
+        const unsigned int m = magnitudes[entry];
+        accumulator[hog[entry]] += m;
+        accumulator[Bins] += m;
         for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
     }
-    std::memcpy(target.row(H), target.row(H - 1), sizeof(unsigned int) * channels * (W + 1));
+    // column W repeats the last sums: the border pixel adds nothing
+    for (int k = 0; k < channels; ++k) out[k] = above[k] + accumulator[k];
+}
+}  // namespace
+
+// The accumulators live in vector registers: a pixel adds its magnitude to the lanes of its
+// bin and of the total through a lane mask. A scalar accumulator would be stored and at once
+// reloaded by the vector adds, and that store-to-load stall costs more than the masks.
+// The whole-vector stores run up to three lanes into the next position, which is written
+// after; the last position takes the exact channel count.
+#if defined(LQ_HAVE_NEON)
+namespace {
+template <int Bins>
+void hogRowNeon(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int width,
+                const unsigned char* hog, const unsigned int* previous, unsigned int* current) {
+    constexpr int channels = Bins + 1, vectors = (channels + 3) / 4;
+    const unsigned char* magnitudes = getMagnitudes();
+    uint32x4_t accumulator[vectors], lane[vectors], total[vectors];
+    for (int v = 0; v < vectors; ++v) {
+        accumulator[v] = vdupq_n_u32(0);
+        const uint32_t lanes[4] = {uint32_t(4 * v), uint32_t(4 * v + 1), uint32_t(4 * v + 2), uint32_t(4 * v + 3)};
+        lane[v] = vld1q_u32(lanes);
+        total[v] = vceqq_u32(lane[v], vdupq_n_u32(Bins));
+    }
+    const unsigned int* above = previous + 2 * channels;
+    unsigned int* out = current + 2 * channels;
+    for (int i = 1; i <= width - 2; ++i, above += channels, out += channels) {
+        const int entry = hogEntry(up, mid, down, i);
+        const uint32x4_t bin = vdupq_n_u32(hog[entry]), m = vdupq_n_u32(magnitudes[entry]);
+        for (int v = 0; v < vectors; ++v) {
+            const uint32x4_t hit = vorrq_u32(vceqq_u32(lane[v], bin), total[v]);
+            accumulator[v] = vaddq_u32(accumulator[v], vandq_u32(hit, m));
+            vst1q_u32(out + 4 * v, vaddq_u32(vld1q_u32(above + 4 * v), accumulator[v]));
+        }
+    }
+    unsigned int last[4 * vectors];
+    for (int v = 0; v < vectors; ++v) vst1q_u32(last + 4 * v, accumulator[v]);
+    for (int k = 0; k < channels; ++k) out[k] = above[k] + last[k];
+}
+}  // namespace
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+template <int Bins>
+void hogRowSse(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int width,
+               const unsigned char* hog, const unsigned int* previous, unsigned int* current) {
+    constexpr int channels = Bins + 1, vectors = (channels + 3) / 4;
+    const unsigned char* magnitudes = getMagnitudes();
+    __m128i accumulator[vectors], lane[vectors], total[vectors];
+    for (int v = 0; v < vectors; ++v) {
+        accumulator[v] = _mm_setzero_si128();
+        lane[v] = _mm_setr_epi32(4 * v, 4 * v + 1, 4 * v + 2, 4 * v + 3);
+        total[v] = _mm_cmpeq_epi32(lane[v], _mm_set1_epi32(Bins));
+    }
+    const unsigned int* above = previous + 2 * channels;
+    unsigned int* out = current + 2 * channels;
+    for (int i = 1; i <= width - 2; ++i, above += channels, out += channels) {
+        const int entry = hogEntry(up, mid, down, i);
+        const __m128i bin = _mm_set1_epi32(hog[entry]), m = _mm_set1_epi32(magnitudes[entry]);
+        for (int v = 0; v < vectors; ++v) {
+            const __m128i hit = _mm_or_si128(_mm_cmpeq_epi32(lane[v], bin), total[v]);
+            accumulator[v] = _mm_add_epi32(accumulator[v], _mm_and_si128(hit, m));
+            const __m128i sum =
+                _mm_add_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(above + 4 * v)), accumulator[v]);
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 4 * v), sum);
+        }
+    }
+    unsigned int last[4 * vectors];
+    for (int v = 0; v < vectors; ++v) _mm_storeu_si128(reinterpret_cast<__m128i*>(last + 4 * v), accumulator[v]);
+    for (int k = 0; k < channels; ++k) out[k] = above[k] + last[k];
+}
+}  // namespace
+#endif
+
+void integralHogRowScalar(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                          const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
+    if (bins == 12)
+        hogRowScalar<12>(above, centre, below, width, hog, previous, current);
+    else
+        hogRowScalar<6>(above, centre, below, width, hog, previous, current);
+}
+
+#if defined(LQ_HAVE_NEON)
+void integralHogRowNeon(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                        const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
+    if (bins == 12)
+        hogRowNeon<12>(above, centre, below, width, hog, previous, current);
+    else
+        hogRowNeon<6>(above, centre, below, width, hog, previous, current);
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+void integralHogRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                       const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
+    if (bins == 12)
+        hogRowSse<12>(above, centre, below, width, hog, previous, current);
+    else
+        hogRowSse<6>(above, centre, below, width, hog, previous, current);
+}
+#endif
+
+namespace {
+void integralHogRow(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                    const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    integralHogRowNeon(above, centre, below, width, hog, bins, previous, current);
+#elif defined(LQ_HAVE_SSSE3)
+    integralHogRowSse(above, centre, below, width, hog, bins, previous, current);
+#else
+    integralHogRowScalar(above, centre, below, width, hog, bins, previous, current);
+#endif
 }
 }  // namespace
 
@@ -226,11 +334,12 @@ void computeIntegralHog(const unsigned char* data, int stripLength, Image& targe
     std::memset(target.row(1), 0, rowBytes);
     for (int y = 2; y < H; ++y) std::memset(target.row(y), 0, sizeof(unsigned int) * (bins + 1) * 2);
 
-    const unsigned char* origin = data + static_cast<ptrdiff_t>(rect.top) * stripLength + rect.left;
-    if (bins == 12)
-        integralHogRows<12>(origin, stripLength, target, getHogSigned12(), W, H);
-    else
-        integralHogRows<6>(origin, stripLength, target, getHogUnsigned6(), W, H);
+    const unsigned char* hog = bins == 12 ? getHogSigned12() : getHogUnsigned6();
+    const unsigned char* up = data + static_cast<ptrdiff_t>(rect.top) * stripLength + rect.left;
+    for (int j = 1; j <= H - 2; ++j, up += stripLength)
+        integralHogRow(up, up + stripLength, up + 2 * stripLength, W, hog, bins, target.row<unsigned int>(j),
+                       target.row<unsigned int>(j + 1));
+    std::memcpy(target.row(H), target.row(H - 1), rowBytes);
 }
 
 void computeIntegralHog(const Image& image, Image& target, const BaseRect<int>& rect, ColorMode mode) {

@@ -34,6 +34,20 @@ void integralRowNeon(const unsigned char* in, const unsigned int* above, unsigne
 void integralRowSse(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
 #endif
 
+// One row of an integral HOG of a region width pixels wide (at least 3), between the source
+// rows above and below: positions 2 .. width of current from previous and the gradients of
+// centre. hog is one of the two bin tables, bins its bin count.
+void integralHogRowScalar(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                          const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current);
+#if defined(LQ_HAVE_NEON)
+void integralHogRowNeon(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                        const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+void integralHogRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                       const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current);
+#endif
+
 // 512 x 512 tables addressed [a + 256][b + 256], built at first use
 const unsigned char* getMagnitudes();
 const unsigned char* getHogUnsigned6();

@@ -287,7 +287,7 @@ bool CommandLineParser::getBool(const std::string& key) const {
 std::map<std::string, std::string> CommandLineParser::getArgs() const {
     std::map<std::string, std::string> result;
     for (const auto& entry : keyIndex_) {
-        
+        if (entry.first.find("--") == std::string::npos) continue;
         const auto value = values_.find(entry.second);
         if (value != values_.end()) result[entry.first] = value->second;
     }
