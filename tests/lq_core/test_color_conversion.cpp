@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <functional>
+#include <random>
 
 #include "LQ_ColorSpaceConversion.h"
 #include "LQ_Depth.h"
@@ -197,4 +199,161 @@ TEST(ColorConversion, DepthRamp) {
     LQ::toMono(depth, out, Rect());
     EXPECT_EQ(out.pixel(0, 0)[0], 5);                                   // 255 / 4500 * 100
     EXPECT_EQ(out.pixel(1, 0)[0], static_cast<unsigned char>(-5));      // below the range: wraps
+}
+
+namespace {
+using Bytes = std::vector<unsigned char>;
+
+// Row buffers of exactly the size a kernel may touch, so that a read or write past them
+// shows under the sanitizer.
+struct Nv21Row {
+    Bytes luma, pairs;
+    Nv21Row(int width, int zoom, std::mt19937& random)
+        : luma(randomBytes(zoom * width, random)), pairs(randomBytes((zoom * width + 1) & ~1, random)) {}
+};
+}  // namespace
+
+#if defined(LQ_HAVE_NEON)
+TEST(ColorConversion, NeonRowsEqualScalarRows) {
+    std::mt19937 random(21);
+    for (int width = 1; width <= 67; ++width) {
+        for (int step : {3, 4}) {
+            const Bytes in = randomBytes(step * width, random);
+            for (int r : {0, 2}) {
+                Bytes scalar(width, 1), vector(width, 2);
+                LQ::lumaRowScalar(in.data(), scalar.data(), width, step, r, 1, 2 - r);
+                LQ::lumaRowNeon(in.data(), vector.data(), width, step, r);
+                EXPECT_EQ(scalar, vector) << "luma, width " << width << " step " << step << " red at " << r;
+            }
+        }
+        const Bytes yuv = randomBytes(3 * width, random);
+        Bytes scalar(width, 1), vector(width, 2);
+        LQ::yuvToMonoRowScalar(yuv.data(), scalar.data(), width);
+        LQ::yuvToMonoRowNeon(yuv.data(), vector.data(), width);
+        EXPECT_EQ(scalar, vector) << "YUV to mono, width " << width;
+
+        for (int zoom : {1, 2}) {
+            const Nv21Row row(width, zoom, random);
+            for (bool flip : {false, true}) {
+                Bytes scalar(3 * width, 1), vector(3 * width, 2);
+                LQ::nv21RowScalar(row.luma.data(), row.pairs.data(), scalar.data(), width, zoom, flip);
+                LQ::nv21RowNeon(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
+                EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
+            }
+        }
+    }
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+TEST(ColorConversion, HostVectorRowsEqualScalarRows) {
+    if (!__builtin_cpu_supports("ssse3")) GTEST_SKIP() << "this processor has no SSSE3";
+    const bool avx2 = __builtin_cpu_supports("avx2");
+    std::mt19937 random(22);
+    for (int width = 1; width <= 67; ++width) {
+        const Bytes in = randomBytes(3 * width, random);
+        for (int r : {0, 2}) {
+            Bytes scalar(width, 1), vector(width, 2);
+            LQ::lumaRowScalar(in.data(), scalar.data(), width, 3, r, 1, 2 - r);
+            LQ::lumaRowSse(in.data(), vector.data(), width, r);
+            EXPECT_EQ(scalar, vector) << "luma, width " << width << " red at " << r;
+            if (avx2) {
+                LQ::lumaRowAvx2(in.data(), vector.data(), width, r);
+                EXPECT_EQ(scalar, vector) << "luma AVX2, width " << width << " red at " << r;
+            }
+            Bytes scalar3(3 * width, 1), vector3(3 * width, 2);
+            LQ::rgbToYuvRowScalar(in.data(), scalar3.data(), width, 3, r);
+            LQ::rgbToYuvRowSse(in.data(), vector3.data(), width, r);
+            EXPECT_EQ(scalar3, vector3) << "to YUV, width " << width << " red at " << r;
+            LQ::yuvToRgbRowScalar(in.data(), scalar3.data(), width, 3, r);
+            LQ::yuvToRgbRowSse(in.data(), vector3.data(), width, r);
+            EXPECT_EQ(scalar3, vector3) << "from YUV, width " << width << " red at " << r;
+            if (avx2) {
+                LQ::yuvToRgbRowAvx2(in.data(), vector3.data(), width, r);
+                EXPECT_EQ(scalar3, vector3) << "from YUV AVX2, width " << width << " red at " << r;
+            }
+        }
+        Bytes first(width), spread(3 * width), swapped(3 * width);
+        LQ::channelRowSse(in.data(), first.data(), width, 0);
+        LQ::spreadRowSse(first.data(), spread.data(), width);
+        LQ::swapRowSse(in.data(), swapped.data(), width);
+        for (int x = 0; x < width; ++x) {
+            ASSERT_EQ(first[x], in[3 * x]) << width;
+            ASSERT_EQ(spread[3 * x + 1], in[3 * x]) << width;
+            ASSERT_EQ(spread[3 * x + 2], in[3 * x]) << width;
+            ASSERT_EQ(swapped[3 * x], in[3 * x + 2]) << width;
+            ASSERT_EQ(swapped[3 * x + 1], in[3 * x + 1]) << width;
+            ASSERT_EQ(swapped[3 * x + 2], in[3 * x]) << width;
+        }
+
+        for (int zoom : {1, 2}) {
+            const Nv21Row row(width, zoom, random);
+            for (bool flip : {false, true}) {
+                Bytes scalar(3 * width, 1), vector(3 * width, 2);
+                LQ::nv21RowScalar(row.luma.data(), row.pairs.data(), scalar.data(), width, zoom, flip);
+                LQ::nv21RowSse(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
+                EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
+            }
+        }
+    }
+}
+#endif
+
+TEST(ColorConversion, EverySizeStrideAndRectangle) {
+    using Convert = std::function<void(const Image&, Image&, const Rect&)>;
+    const std::vector<std::pair<LQ::ColorMode, Convert>> conversions = {
+        {LQ::COLOR_MODE_BGR, LQ::bgrToYuv},   {LQ::COLOR_MODE_RGB, LQ::rgbToYuv},
+        {LQ::COLOR_MODE_RGBA, LQ::rgbaToYuv}, {LQ::COLOR_MODE_MONO, LQ::monoToYuv},
+        {LQ::COLOR_MODE_BGR, LQ::bgrToMono},  {LQ::COLOR_MODE_RGBA, LQ::rgbaToMono},
+        {LQ::COLOR_MODE_YUV, LQ::yuvToMono},  {LQ::COLOR_MODE_BGR, LQ::bgrToRgb},
+        {LQ::COLOR_MODE_RGB, LQ::rgbToRgba},  {LQ::COLOR_MODE_RGBA, LQ::rgbaToBgr},
+        {LQ::COLOR_MODE_MONO, LQ::monoToBgr}, {LQ::COLOR_MODE_MONO, LQ::monoToRgba},
+        {LQ::COLOR_MODE_YUV, LQ::yuvToBgr},   {LQ::COLOR_MODE_YUV, LQ::yuvToRgba},
+        {LQ::COLOR_MODE_MONO16, [](const Image& s, Image& t, const Rect& r) { LQ::mono16ToRgb(s, t, 0.5f, r); }},
+        {LQ::COLOR_MODE_DEPTH, [](const Image& s, Image& t, const Rect& r) { LQ::depthToRgb(s, t, 10, 60000, r); }},
+    };
+    // small sizes for every edge, and widths that reach the 16- and 32-pixel steps
+    std::vector<Size> sizes;
+    for (int h = 1; h <= 9; ++h)
+        for (int w = 1; w <= 9; ++w) sizes.emplace_back(w, h);
+    for (int w : {16, 17, 33, 40}) sizes.emplace_back(w, 3);
+    unsigned seed = 0;
+    for (const Size& size : sizes) {
+        for (const auto& [mode, convert] : conversions) {
+            Image parent, full, fromView;
+            const Image view = randomView(size.width, size.height, mode, ++seed, parent);
+            convert(Image(view), full, Rect());
+            convert(view, fromView, Rect());
+            ASSERT_TRUE(samePixels(full, fromView)) << size << " from " << mode;
+
+            // the inner rectangle (or the last pixel) only, the rest left as it was
+            const Rect inner = size.width > 2 && size.height > 2 ? Rect(1, 1, size.width - 1, size.height - 1)
+                                                                 : Rect(size.width - 1, size.height - 1, size.width, size.height);
+            Image part(size, full.colorMode());
+            for (int y = 0; y < size.height; ++y) std::memset(part.row(y), 0xA5, size.width * part.depth());
+            convert(view, part, inner);
+            for (int y = 0; y < size.height; ++y)
+                for (int x = 0; x < size.width; ++x) {
+                    const bool inside = inner.contains(LQ::PointI(x, y));
+                    for (int c = 0; c < part.depth(); ++c)
+                        ASSERT_EQ(part.pixel(x, y)[c], inside ? full.pixel(x, y)[c] : 0xA5)
+                            << size << " from " << mode << " at " << x << "," << y;
+                }
+        }
+        if (size.width % 2 || size.height % 2) continue;
+        // frames: the mirrored picture is the plain one read from the right
+        std::mt19937 random(seed);
+        const Bytes nv21 = randomBytes(size.width * size.height * 3 / 2, random);
+        for (auto [plain, mirrored] : {std::pair{LQ::nv21ToYuv, LQ::nv21ToYuvFlip},
+                                       std::pair{LQ::nv21ToYuvZoom2, LQ::nv21ToYuvZoom2Flip},
+                                       std::pair{LQ::nv21ToMono, LQ::nv21ToMonoFlip}}) {
+            Image a, b;
+            plain(nv21.data(), size, a);
+            mirrored(nv21.data(), size, b);
+            ASSERT_EQ(a.size(), b.size());
+            for (int y = 0; y < a.height(); ++y)
+                for (int x = 0; x < a.width(); ++x)
+                    ASSERT_EQ(0, std::memcmp(a.pixel(x, y), b.pixel(a.width() - 1 - x, y), a.depth())) << size;
+        }
+    }
 }

@@ -216,6 +216,7 @@ TEST(GradientOperators, FailedChecks) {
         {[&] { LQ::canny(target, first, 1, 2); }, "(source).colorMode() == (COLOR_MODE_MONO)",
          "have COLOR_MODE_GRADIENT, but need COLOR_MODE_MONO"},
         {[&] { LQ::canny(mono, first, 40, 20); }, "(minThreshold) < (maxThreshold)", "40 >= 20"},
+        {[&] { LQ::canny(mono, first, -1, 20); }, "(minThreshold) >= (0)", "-1 < 0"},
     };
     for (const auto& failure : failures) {
         const FailedCheck check = catchCheck(failure.call);

@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <cstring>
+#include <random>
 #include <vector>
 
 #include "LQ_Integral.h"
@@ -41,11 +42,12 @@ TEST(IntegralImage, SumsOfEveryRectAtEverySize) {
                 const Image image = asView ? randomView(width, height, LQ::COLOR_MODE_MONO, seed, parent)
                                            : randomImage(width, height, LQ::COLOR_MODE_MONO, seed);
                 Image integral(Size(width + 1, height + 1), LQ::COLOR_MODE_INTEGRAL);
-                for (const Rect& rect : {image.rect(), Rect(width / 3, height / 2, width, height),
-                                         Rect(0, height / 3, (width + 1) / 2, height), Rect(width - 1, 0, width, 1)}) {
+                for (const Rect& given : {Rect(), Rect(width / 3, height / 2, width, height),
+                                          Rect(0, height / 3, (width + 1) / 2, height), Rect(width - 1, 0, width, 1)}) {
+                    const Rect rect = given.area() == 0 ? image.rect() : given;  // zero area: the whole image
                     // a reused target full of leftovers
                     for (int y = 0; y <= height; ++y) std::memset(integral.row(y), 0x5A, 4 * (width + 1));
-                    LQ::computeIntegral(image, integral, rect);
+                    LQ::computeIntegral(image, integral, given);
                     ASSERT_EQ(integral.size(), Size(width + 1, height + 1));
                     for (int y = 0; y <= height; ++y)
                         for (int x = 0; x <= width; ++x) {
@@ -183,6 +185,33 @@ TEST(IntegralHog, SumsOfMagnitudesPerBinAtEverySize) {
         [&] { LQ::computeIntegralHog(randomImage(6, 6, LQ::COLOR_MODE_MONO, 1), target, Rect(0, 0, 6, 6), LQ::COLOR_MODE_RMCT); });
     EXPECT_EQ(check.expression, "0");
     EXPECT_EQ(check.tail, "incorrect color mode: COLOR_MODE_RMCT");
+}
+
+TEST(IntegralImage, VectorRowsEqualScalarRows) {
+    std::mt19937 random(41);
+    for (int width = 1; width <= 67; ++width)
+        for (int kind = 0; kind < 2; ++kind) {
+            std::vector<unsigned char> in = randomBytes(width, random);
+            if (kind == 1) in.assign(width, 255);  // the largest partial sums
+            std::vector<unsigned int> above(width + 1);
+            for (auto& v : above) v = random();  // wrapping sums must wrap alike
+            std::vector<unsigned int> expected(width + 1, 5);
+            LQ::integralRowScalar(in.data(), above.data(), expected.data(), width);
+            ASSERT_EQ(expected[0], 5u);
+            std::vector<std::pair<const char*, decltype(&LQ::integralRowScalar)>> rowsToCompare;
+#if defined(LQ_HAVE_NEON)
+            rowsToCompare.emplace_back("neon", LQ::integralRowNeon);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+            rowsToCompare.emplace_back("sse", LQ::integralRowSse);
+            if (__builtin_cpu_supports("avx2")) rowsToCompare.emplace_back("avx2", LQ::integralRowAvx2);
+#endif
+            for (const auto& vector : rowsToCompare) {
+                std::vector<unsigned int> actual(width + 1, 5);
+                vector.second(in.data(), above.data(), actual.data(), width);
+                ASSERT_EQ(actual, expected) << vector.first << " width " << width;
+            }
+        }
 }
 
 TEST(IntegralHog, VectorRowsEqualScalarRows) {

@@ -157,3 +157,34 @@ TEST(RmctTransform, BitDifferencesAndTheirChecks) {
     }
     EXPECT_EQ(catchCheck([&] { LQ::bitDiff(a, small, target, rect); }).tail, "have Size(11, 7), but need Size(10, 7)");
 }
+
+TEST(RmctTransform, VectorRowsEqualScalarRows) {
+    std::mt19937 random(37);
+    for (int width = 3; width <= 99; ++width)
+        for (int kind = 0; kind < 3; ++kind) {
+            std::vector<unsigned char> rows[3];
+            for (auto& row : rows) {
+                row = randomBytes(width, random);
+                if (kind == 1)  // all neighbours 255: a threshold of 257, saturated in the vectors
+                    for (auto& b : row) b = b < 40 ? b : 255;
+                if (kind == 2)  // near-flat: the margin decides
+                    for (auto& b : row) b = static_cast<unsigned char>(100 + b % 4);
+            }
+            std::vector<unsigned char> expected(width, 77);
+            LQ::rmctRowScalar(rows[0].data(), rows[1].data(), rows[2].data(), expected.data(), width);
+            ASSERT_EQ(expected[0] + expected[width - 1], 2 * 77);  // the end columns are not touched
+            std::vector<std::pair<const char*, decltype(&LQ::rmctRowScalar)>> rowsToCompare;
+#if defined(LQ_HAVE_NEON)
+            rowsToCompare.emplace_back("neon", LQ::rmctRowNeon);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+            rowsToCompare.emplace_back("sse", LQ::rmctRowSse);
+            if (__builtin_cpu_supports("avx2")) rowsToCompare.emplace_back("avx2", LQ::rmctRowAvx2);
+#endif
+            for (const auto& vector : rowsToCompare) {
+                std::vector<unsigned char> actual(width, 77);
+                vector.second(rows[0].data(), rows[1].data(), rows[2].data(), actual.data(), width);
+                ASSERT_EQ(actual, expected) << vector.first << " width " << width;
+            }
+        }
+}

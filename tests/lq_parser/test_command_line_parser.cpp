@@ -156,6 +156,8 @@ TEST(CommandLineParser, ImportsCommentsAndUsage) {
     std::vector<std::pair<std::string, std::string>> pairs;
     LQ::parseString("-a 1 -b --long=\"x y\" --bare", pairs);
     EXPECT_EQ(pairs, (std::vector<std::pair<std::string, std::string>>{{"a", "1"}, {"b", ""}, {"long", "x y"}, {"bare", ""}}));
+    EXPECT_EQ(catchCheck([&] { LQ::parseString("-a 1 2", pairs); }).tail, "cannot find key in -a 1 2");
+    EXPECT_EQ(catchCheck([&] { LQ::parseString("-", pairs); }).tail, "cannot find key in -");
 }
 
 TEST(CommandLineParser, HelpPrintsUsageAndEnds) {

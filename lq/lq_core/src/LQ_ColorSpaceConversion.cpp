@@ -52,50 +52,61 @@ void forEachPixel(const Image& source, Image& target, const BaseRect<int>& area,
     }
 }
 
-template <int Step, int r, int b>
-void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area) {
-#if defined(LQ_HAVE_SSSE3)
-    if constexpr (Step == 3) {
-        if (haveSsse3Cpu()) {
-            for (int y = area.top; y < area.bottom; ++y)
-                rgbToYuvRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
-            return;
-        }
+template <int Step, int r>
+void rgbToYuvPixels(const unsigned char* __restrict in, unsigned char* __restrict out, int width) {
+    constexpr int g = 1, b = 2 - r;
+    for (int x = 0; x < width; ++x) {
+        const unsigned char* p = in + Step * x;
+        out[3 * x] = luma(p[r], p[g], p[b]);
+        out[3 * x + 1] = chromaU(p[r], p[g], p[b]);
+        out[3 * x + 2] = chromaV(p[r], p[g], p[b]);
     }
-#endif
-    constexpr int g = 1;
-    forEachPixel<unsigned char, unsigned char, Step, 3>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
-        q[0] = luma(p[r], p[g], p[b]);
-        q[1] = chromaU(p[r], p[g], p[b]);
-        q[2] = chromaV(p[r], p[g], p[b]);
-    });
 }
 
-template <int Step, int r, int b, int a>
-void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area) {
-#if defined(LQ_HAVE_SSSE3)
-    if constexpr (Step == 3) {
-        if (haveSsse3Cpu()) {
-            for (int y = area.top; y < area.bottom; ++y) {
-                if (haveAvx2Cpu())
-                    yuvToRgbRowAvx2(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
-                else
-                    yuvToRgbRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), r);
-            }
-            return;
-        }
-    }
-#endif
-    constexpr int g = 1;
-    forEachPixel<unsigned char, unsigned char, 3, Step>(source, target, area, [=](const unsigned char* p, unsigned char* q) {
-        const float y = p[0], u = p[1] - 128.f, v = p[2] - 128.f;
+template <int Step, int r>
+void yuvToRgbPixels(const unsigned char* __restrict in, unsigned char* __restrict out, int width) {
+    constexpr int g = 1, b = 2 - r;
+    for (int x = 0; x < width; ++x) {
+        const float y = in[3 * x], u = in[3 * x + 1] - 128.f, v = in[3 * x + 2] - 128.f;
+        unsigned char* q = out + Step * x;
         q[r] = clampByte(y + v * 1.370705f);
         q[g] = clampByte(y + v * -0.698001f + u * -0.337633f);
         q[b] = clampByte(y + u * 1.732446f);
-        if (a >= 0) q[a < 0 ? 0 : a] = 255;
-    });
+        if (Step == 4) q[3] = 255;
+    }
 }
 
+void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area, int r) {
+    for (int y = area.top; y < area.bottom; ++y) {
+        const unsigned char* in = source.pixel(area.left, y);
+        unsigned char* out = target.pixel(area.left, y);
+#if defined(LQ_HAVE_SSSE3)
+        if (source.depth() == 3 && haveSsse3Cpu()) {
+            rgbToYuvRowSse(in, out, area.width(), r);
+            continue;
+        }
+#endif
+        rgbToYuvRowScalar(in, out, area.width(), source.depth(), r);
+    }
+}
+
+void yuvToRgbAt(const Image& source, Image& target, const BaseRect<int>& area, int r) {
+    for (int y = area.top; y < area.bottom; ++y) {
+        const unsigned char* in = source.pixel(area.left, y);
+        unsigned char* out = target.pixel(area.left, y);
+#if defined(LQ_HAVE_SSSE3)
+        if (target.depth() == 3 && haveAvx2Cpu()) {
+            yuvToRgbRowAvx2(in, out, area.width(), r);
+            continue;
+        }
+        if (target.depth() == 3 && haveSsse3Cpu()) {
+            yuvToRgbRowSse(in, out, area.width(), r);
+            continue;
+        }
+#endif
+        yuvToRgbRowScalar(in, out, area.width(), target.depth(), r);
+    }
+}
 
 // Luma of a rectangle; the vector rows where the pixel layout allows them.
 void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r, int g, int b) {
@@ -125,6 +136,20 @@ void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r
 
 void lumaRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r, int g, int b) {
     for (int x = 0; x < width; ++x, in += step) out[x] = luma(in[r], in[g], in[b]);
+}
+
+void rgbToYuvRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r) {
+    if (step == 4)
+        r == 0 ? rgbToYuvPixels<4, 0>(in, out, width) : rgbToYuvPixels<4, 2>(in, out, width);
+    else
+        r == 0 ? rgbToYuvPixels<3, 0>(in, out, width) : rgbToYuvPixels<3, 2>(in, out, width);
+}
+
+void yuvToRgbRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r) {
+    if (step == 4)
+        r == 0 ? yuvToRgbPixels<4, 0>(in, out, width) : yuvToRgbPixels<4, 2>(in, out, width);
+    else
+        r == 0 ? yuvToRgbPixels<3, 0>(in, out, width) : yuvToRgbPixels<3, 2>(in, out, width);
 }
 
 #if defined(LQ_HAVE_NEON)
@@ -311,12 +336,7 @@ __attribute__((target("ssse3"))) void yuvToRgbRowSse(const unsigned char* in, un
         const __m128i ordered[3] = {channels[r == 0 ? 0 : 2], channels[1], channels[r == 0 ? 2 : 0]};
         storePixels(out + 3 * x, ordered);
     }
-    for (; x < width; ++x) {
-        const float y = in[3 * x], u = in[3 * x + 1] - 128.f, v = in[3 * x + 2] - 128.f;
-        out[3 * x + r] = clampByte(y + v * 1.370705f);
-        out[3 * x + 1] = clampByte(y + v * -0.698001f + u * -0.337633f);
-        out[3 * x + 2 - r] = clampByte(y + u * 1.732446f);
-    }
+    yuvToRgbRowScalar(in + 3 * x, out + 3 * x, width - x, 3, r);
 }
 
 namespace {
@@ -376,12 +396,7 @@ __attribute__((target("ssse3"))) void rgbToYuvRowSse(const unsigned char* in, un
         for (int c = 0; c < 3; ++c) channels[c] = _mm_packus_epi16(yuv[c][0], yuv[c][1]);
         storePixels(out + 3 * x, channels);
     }
-    for (; x < width; ++x) {
-        const unsigned char* p = in + 3 * x;
-        out[3 * x] = luma(p[r], p[1], p[2 - r]);
-        out[3 * x + 1] = chromaU(p[r], p[1], p[2 - r]);
-        out[3 * x + 2] = chromaV(p[r], p[1], p[2 - r]);
-    }
+    rgbToYuvRowScalar(in + 3 * x, out + 3 * x, width - x, 3, r);
 }
 
 __attribute__((target("ssse3"))) void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c) {
@@ -441,17 +456,17 @@ __attribute__((target("ssse3"))) void lumaRowSse(const unsigned char* in, unsign
 
 void bgrToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_BGR, COLOR_MODE_YUV);
-    rgbToYuvAt<3, 2, 0>(source, target, area);
+    rgbToYuvAt(source, target, area, 2);
 }
 
 void rgbToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGB, COLOR_MODE_YUV);
-    rgbToYuvAt<3, 0, 2>(source, target, area);
+    rgbToYuvAt(source, target, area, 0);
 }
 
 void rgbaToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_RGBA, COLOR_MODE_YUV);
-    rgbToYuvAt<4, 0, 2>(source, target, area);
+    rgbToYuvAt(source, target, area, 0);
 }
 
 void monoToYuv(const Image& source, Image& target, const BaseRect<int>& rect) {
@@ -482,13 +497,16 @@ void yuvToMono(const Image& source, Image& target, const BaseRect<int>& rect) {
     for (int y = area.top; y < area.bottom; ++y) {
         const unsigned char* in = source.pixel(area.left, y);
         unsigned char* out = target.pixel(area.left, y);
-#if defined(LQ_HAVE_SSSE3)
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+        yuvToMonoRowNeon(in, out, area.width());
+        continue;
+#elif defined(LQ_HAVE_SSSE3)
         if (haveSsse3Cpu()) {
             channelRowSse(in, out, area.width(), 0);
             continue;
         }
 #endif
-        for (int x = 0; x < area.width(); ++x) out[x] = in[3 * x];
+        yuvToMonoRowScalar(in, out, area.width());
     }
 }
 
@@ -635,37 +653,150 @@ void mono16ToFloat(const Image& source, Image& target, float factor, const BaseR
 
 void yuvToBgr(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_BGR);
-    yuvToRgbAt<3, 2, 0, -1>(source, target, area);
+    yuvToRgbAt(source, target, area, 2);
 }
 
 void yuvToRgb(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGB);
-    yuvToRgbAt<3, 0, 2, -1>(source, target, area);
+    yuvToRgbAt(source, target, area, 0);
 }
 
 void yuvToRgba(const Image& source, Image& target, const BaseRect<int>& rect) {
     LQ_CONVERSION_START(COLOR_MODE_YUV, COLOR_MODE_RGBA);
-    yuvToRgbAt<4, 0, 2, 3>(source, target, area);
+    yuvToRgbAt(source, target, area, 0);
 }
 
 // ---- camera formats ------------------------------------------------------------------------
 
 namespace {
+template <int zoom, bool flip>
+void nv21RowAt(const unsigned char* __restrict luma, const unsigned char* __restrict pairs, unsigned char* __restrict out,
+               int width) {
+    for (int x = 0; x < width; ++x) {
+        const int column = zoom * (flip ? width - 1 - x : x);
+        const int pair = column & ~1;
+        out[3 * x] = luma[column];
+        out[3 * x + 1] = pairs[pair + 1];
+        out[3 * x + 2] = pairs[pair];
+    }
+}
+}  // namespace
+
+void nv21RowScalar(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                   bool flip) {
+    if (zoom == 2)
+        flip ? nv21RowAt<2, true>(luma, pairs, out, width) : nv21RowAt<2, false>(luma, pairs, out, width);
+    else
+        flip ? nv21RowAt<1, true>(luma, pairs, out, width) : nv21RowAt<1, false>(luma, pairs, out, width);
+}
+
+void yuvToMonoRowScalar(const unsigned char* in, unsigned char* out, int width) {
+    for (int x = 0; x < width; ++x) out[x] = in[3 * x];
+}
+
+// The vector rows take 16 target pixels a step. A mirrored step reads the source block
+// that ends where the previous one began and reverses each channel; what is left over at
+// the end of a row is the scalar row of the remaining width, mirrored or not, which reads
+// the same columns. A full-size mirrored row of odd width would put the blocks across the
+// chroma pairs, so it stays scalar (camera frames have even widths).
+#if defined(LQ_HAVE_NEON)
+namespace {
+inline uint8x16_t reverse16(uint8x16_t v) {
+    const uint8x16_t halves = vrev64q_u8(v);
+    return vextq_u8(halves, halves, 8);
+}
+}  // namespace
+
+void nv21RowNeon(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                 bool flip) {
+    int x = 0;
+    if (!(flip && zoom == 1 && width % 2)) {
+        for (; x + 16 <= width; x += 16) {
+            const int s = zoom * (flip ? width - x - 16 : x);
+            uint8x16x3_t p;
+            if (zoom == 2) {
+                const uint8x16x2_t l = vld2q_u8(luma + s);
+                const uint8x16x2_t vu = vld2q_u8(pairs + s);
+                p.val[0] = l.val[0], p.val[1] = vu.val[1], p.val[2] = vu.val[0];
+            } else {
+                const uint8x8x2_t vu = vld2_u8(pairs + s);
+                const uint8x8x2_t u = vzip_u8(vu.val[1], vu.val[1]);
+                const uint8x8x2_t v = vzip_u8(vu.val[0], vu.val[0]);
+                p.val[0] = vld1q_u8(luma + s);
+                p.val[1] = vcombine_u8(u.val[0], u.val[1]);
+                p.val[2] = vcombine_u8(v.val[0], v.val[1]);
+            }
+            if (flip)
+                for (int c = 0; c < 3; ++c) p.val[c] = reverse16(p.val[c]);
+            vst3q_u8(out + 3 * x, p);
+        }
+    }
+    if (flip)
+        nv21RowScalar(luma, pairs, out + 3 * x, width - x, zoom, true);
+    else
+        nv21RowScalar(luma + zoom * x, pairs + zoom * x, out + 3 * x, width - x, zoom, false);
+}
+
+void yuvToMonoRowNeon(const unsigned char* in, unsigned char* out, int width) {
+    int x = 0;
+    for (; x + 16 <= width; x += 16) vst1q_u8(out + x, vld3q_u8(in + 3 * x).val[0]);
+    yuvToMonoRowScalar(in + 3 * x, out + x, width - x);
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+__attribute__((target("ssse3"))) void nv21RowSse(const unsigned char* luma, const unsigned char* pairs,
+                                                  unsigned char* out, int width, int zoom, bool flip) {
+    const __m128i low = _mm_set1_epi16(0xFF);
+    const __m128i reverse = _mm_setr_epi8(15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0);
+    const auto load = [](const unsigned char* p) { return _mm_loadu_si128(reinterpret_cast<const __m128i*>(p)); };
+    int x = 0;
+    if (!(flip && zoom == 1 && width % 2)) {
+        for (; x + 16 <= width; x += 16) {
+            const int s = zoom * (flip ? width - x - 16 : x);
+            __m128i p[3];
+            if (zoom == 2) {
+                const __m128i l0 = load(luma + s), l1 = load(luma + s + 16);
+                const __m128i c0 = load(pairs + s), c1 = load(pairs + s + 16);
+                p[0] = _mm_packus_epi16(_mm_and_si128(l0, low), _mm_and_si128(l1, low));
+                p[1] = _mm_packus_epi16(_mm_srli_epi16(c0, 8), _mm_srli_epi16(c1, 8));
+                p[2] = _mm_packus_epi16(_mm_and_si128(c0, low), _mm_and_si128(c1, low));
+            } else {
+                const __m128i c = load(pairs + s);
+                const __m128i u = _mm_srli_epi16(c, 8), v = _mm_and_si128(c, low);
+                p[0] = load(luma + s);
+                p[1] = _mm_or_si128(u, _mm_slli_epi16(u, 8));
+                p[2] = _mm_or_si128(v, _mm_slli_epi16(v, 8));
+            }
+            if (flip)
+                for (int c = 0; c < 3; ++c) p[c] = _mm_shuffle_epi8(p[c], reverse);
+            storePixels(out + 3 * x, p);
+        }
+    }
+    if (flip)
+        nv21RowScalar(luma, pairs, out + 3 * x, width - x, zoom, true);
+    else
+        nv21RowScalar(luma + zoom * x, pairs + zoom * x, out + 3 * x, width - x, zoom, false);
+}
+#endif
+
+namespace {
 // zoom 1 or 2; a flip reads the columns from the right
 void nv21ToYuvRows(const unsigned char* nv21, int width, int height, Image& target, int zoom, bool flip) {
     const unsigned char* chroma = nv21 + static_cast<size_t>(width) * height;
-    const int outWidth = target.width();
     for (int y = 0; y < target.height(); ++y) {
         const unsigned char* luma = nv21 + static_cast<size_t>(y * zoom) * width;
         const unsigned char* pairs = chroma + static_cast<size_t>(y * zoom / 2) * width;
-        unsigned char* out = target.row(y);
-        for (int x = 0; x < outWidth; ++x) {
-            const int column = (flip ? outWidth - 1 - x : x) * zoom;
-            const int pair = column & ~1;
-            out[3 * x] = luma[column];
-            out[3 * x + 1] = pairs[pair + 1];
-            out[3 * x + 2] = pairs[pair];
-        }
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+        nv21RowNeon(luma, pairs, target.row(y), target.width(), zoom, flip);
+#elif defined(LQ_HAVE_SSSE3)
+        if (haveSsse3Cpu())
+            nv21RowSse(luma, pairs, target.row(y), target.width(), zoom, flip);
+        else
+            nv21RowScalar(luma, pairs, target.row(y), target.width(), zoom, flip);
+#else
+        nv21RowScalar(luma, pairs, target.row(y), target.width(), zoom, flip);
+#endif
     }
 }
 }  // namespace

@@ -59,9 +59,23 @@ void toColorMode(const Image& source, Image& target, ColorMode mode, const BaseR
 // Luma rows, exposed so the vector paths can be compared with the scalar one: pixels of
 // `step` bytes with red, green and blue at the given byte offsets.
 void lumaRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r, int g, int b);
+// RGB of `step` (3 or 4) bytes, red at byte r (0 or 2), to YUV and back; four-byte
+// targets get alpha 255
+void rgbToYuvRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r);
+void yuvToRgbRowScalar(const unsigned char* in, unsigned char* out, int width, int step, int r);
+// One target row of NV21: pixel x takes luma[zoom * x] and the V, U pair of that column,
+// zoom 1 or 2; mirrored, pixel x is pixel width - 1 - x of the plain row. The luma and pair
+// rows hold zoom * width bytes (rounded up to even).
+void nv21RowScalar(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                   bool flip);
+// the Y byte of each YUV pixel
+void yuvToMonoRowScalar(const unsigned char* in, unsigned char* out, int width);
 #if defined(LQ_HAVE_NEON)
 // three- and four-byte pixels; r is 0 or 2
 void lumaRowNeon(const unsigned char* in, unsigned char* out, int width, int step, int r);
+void nv21RowNeon(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                 bool flip);
+void yuvToMonoRowNeon(const unsigned char* in, unsigned char* out, int width);
 #endif
 #if defined(LQ_HAVE_SSSE3)
 // three-byte pixels; r is 0 or 2; needs SSSE3
@@ -72,6 +86,9 @@ void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
 void yuvToRgbRowSse(const unsigned char* in, unsigned char* out, int width, int r);
 void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r);
 void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
+// needs SSSE3
+void nv21RowSse(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                bool flip);
 // byte c of each three-byte pixel
 void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c);
 // each byte into a three-byte pixel

@@ -208,10 +208,13 @@ void computeGradients(const Image& source, Image& target) {
     if (source.width() < 3 || source.height() < 3) return;
     const double P = 3.1415927410125732;
     for (int y = 1; y + 1 < source.height(); ++y) {
+        const unsigned char* up = source.row(y - 1);
+        const unsigned char* mid = source.row(y);
+        const unsigned char* down = source.row(y + 1);
         unsigned char* out = target.row(y);
         for (int x = 1; x + 1 < source.width(); ++x) {
             int gx, gy;
-            sobelAt(source.row(y - 1), source.row(y), source.row(y + 1), x, gx, gy);
+            sobelAt(up, mid, down, x, gx, gy);
             const int d = static_cast<int>(std::atan2(double(gx), double(gy)) * 4 / P + 4.5);
             out[2 * x] = static_cast<unsigned char>(d % 4);
             out[2 * x + 1] = static_cast<unsigned char>((std::abs(gx) + std::abs(gy)) >> 3);
@@ -236,23 +239,32 @@ void thinGradients(Image& image) {
     }
 }
 
-void updateGradients(unsigned char* pixel, int low, int stripLength) {
-    // an explicit stack: an edge may be longer than the call stack allows
-    std::vector<unsigned char*> pending(1, pixel);
+namespace {
+// The hysteresis step with an explicit stack, since an edge may be longer than the call stack
+// allows. A pixel is judged when it is taken from the stack, as a recursive call would judge
+// it on entry, so the result is the recursion's.
+void walkEdge(unsigned char* pixel, int low, ptrdiff_t stripLength, std::vector<unsigned char*>& pending) {
     const ptrdiff_t neighbours[8] = {-stripLength - 2, -stripLength, -stripLength + 2, -2, 2,
                                      stripLength - 2,  stripLength,  stripLength + 2};
+    pending.assign(1, pixel);
     while (!pending.empty()) {
         unsigned char* p = pending.back();
         pending.pop_back();
         if (p[0] < 255 && p[1] > low) {
             if (p[1] == 255) continue;
             p[1] = 255;
-            // pushed in reverse so they are taken in the order of the rows
+            // pushed in reverse so that they are taken in the order of the rows
             for (int i = 7; i >= 0; --i) pending.push_back(p + neighbours[i]);
         } else {
             p[1] = 0;
         }
     }
+}
+}  // namespace
+
+void updateGradients(unsigned char* pixel, int low, int stripLength) {
+    std::vector<unsigned char*> pending;
+    walkEdge(pixel, low, stripLength, pending);
 }
 
 void canny(const Image& source, Image& target, int minThreshold, int maxThreshold) {
@@ -263,11 +275,11 @@ void canny(const Image& source, Image& target, int minThreshold, int maxThreshol
     LQ_ASSERT_LT(minThreshold, maxThreshold);
     // a negative low threshold would let the edge walk leave the image through its zero border
     LQ_ASSERT_GE(minThreshold, 0);
-    const int stripLength = static_cast<int>(gradients.stripLength());
+    std::vector<unsigned char*> pending;  // one stack for every walk
     for (int y = 1; y + 1 < gradients.height(); ++y)
         for (int x = 1; x + 1 < gradients.width(); ++x) {
             unsigned char* p = gradients.pixel(x, y);
-            if (p[0] != 255 && p[1] > maxThreshold) updateGradients(p, minThreshold, stripLength);
+            if (p[0] != 255 && p[1] > maxThreshold) walkEdge(p, minThreshold, gradients.stripLength(), pending);
         }
     target.create(source.size(), COLOR_MODE_MONO);
     clear(target);

@@ -18,6 +18,7 @@ void robertCross(const Image& source, Image& target);
 void computeGradients(const Image& source, Image& target);
 void thinGradients(Image& image);
 void updateGradients(unsigned char* pixel, int low, int stripLength);
+// minThreshold must not be negative: the edge walk stops at the zero border only then
 void canny(const Image& source, Image& target, int minThreshold, int maxThreshold);
 
 // Row kernels, exposed so the vector paths can be compared with the scalar one: Gx / 8 and

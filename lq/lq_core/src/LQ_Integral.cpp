@@ -67,12 +67,44 @@ void integralRowSse(const unsigned char* in, const unsigned int* above, unsigned
 }
 #endif
 
+#if defined(LQ_HAVE_SSSE3)
+__attribute__((target("avx2"))) void integralRowAvx2(const unsigned char* in, const unsigned int* above,
+                                                     unsigned int* out, int width) {
+    __m256i carry = _mm256_setzero_si256();
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        // prefix sums of two groups of eight bytes in 16 bits, within the two 128-bit halves
+        __m256i s = _mm256_cvtepu8_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + x)));
+        s = _mm256_add_epi16(s, _mm256_slli_si256(s, 2));
+        s = _mm256_add_epi16(s, _mm256_slli_si256(s, 4));
+        s = _mm256_add_epi16(s, _mm256_slli_si256(s, 8));
+        // the first group's total, spread over the second half only (at most 4080: 16 bits)
+        __m256i first = _mm256_shufflehi_epi16(s, 0xFF);
+        first = _mm256_permute2x128_si256(_mm256_unpackhi_epi64(first, first), first, 0x08);
+        s = _mm256_add_epi16(s, first);
+        const __m256i low = _mm256_add_epi32(_mm256_cvtepu16_epi32(_mm256_castsi256_si128(s)), carry);
+        const __m256i high = _mm256_add_epi32(_mm256_cvtepu16_epi32(_mm256_extracti128_si256(s, 1)), carry);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x + 1),
+                            _mm256_add_epi32(low, _mm256_loadu_si256(reinterpret_cast<const __m256i*>(above + x + 1))));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x + 9),
+                            _mm256_add_epi32(high, _mm256_loadu_si256(reinterpret_cast<const __m256i*>(above + x + 9))));
+        carry = _mm256_permutevar8x32_epi32(high, _mm256_set1_epi32(7));
+    }
+    unsigned int run = static_cast<unsigned int>(_mm256_extract_epi32(carry, 0));
+    for (; x < width; ++x) {
+        run += in[x];
+        out[x + 1] = run + above[x + 1];
+    }
+}
+#endif
+
 namespace {
 void integralRow(const unsigned char* in, const unsigned int* above, unsigned int* out, int width) {
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
     integralRowNeon(in, above, out, width);
 #elif defined(LQ_HAVE_SSSE3)
-    integralRowSse(in, above, out, width);
+    static const auto row = __builtin_cpu_supports("avx2") ? integralRowAvx2 : integralRowSse;
+    row(in, above, out, width);
 #else
     integralRowScalar(in, above, out, width);
 #endif
@@ -161,9 +193,10 @@ struct Tables {
     }
 };
 
+// built at first use and kept for the life of the process
 const Tables& tables() {
-    static const Tables built;
-    return built;
+    static const Tables* built = new Tables;
+    return *built;
 }
 }  // namespace
 

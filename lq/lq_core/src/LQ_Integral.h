@@ -7,7 +7,8 @@
 
 namespace LQ {
 
-// (W + 1) x (H + 1) sums of the whole image's size; inside rect the sums of rect alone.
+// (W + 1) x (H + 1) sums of the whole image's size; inside rect the sums of rect alone, 0
+// elsewhere. A rect of zero area means the whole image.
 void computeIntegral(const Image& image, Image& integral, const BaseRect<int>& rect);
 void computeIntegral(const Image& image, Image& integral);
 // whole image, compact rows only
@@ -32,6 +33,8 @@ void integralRowNeon(const unsigned char* in, const unsigned int* above, unsigne
 #if defined(LQ_HAVE_SSSE3)
 // SSE2, which every x86-64 processor has
 void integralRowSse(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
+// only where the processor has AVX2
+void integralRowAvx2(const unsigned char* in, const unsigned int* above, unsigned int* out, int width);
 #endif
 
 // One row of an integral HOG of a region width pixels wide (at least 3), between the source

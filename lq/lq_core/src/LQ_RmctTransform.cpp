@@ -75,13 +75,43 @@ void rmctRowSse(const unsigned char* above, const unsigned char* centre, const u
         const __m128i t = _mm_packus_epi16(_mm_srli_epi16(low, 3), _mm_srli_epi16(high, 3));
         __m128i code = zero;
         for (int i = 0; i < 8; ++i) {
-            // n > t exactly when the saturating difference is not zero
-            const __m128i greater = _mm_xor_si128(_mm_cmpeq_epi8(_mm_subs_epu8(n[i], t), zero), _mm_set1_epi8(-1));
-            code = _mm_or_si128(code, _mm_and_si128(greater, _mm_set1_epi8(static_cast<char>(0x80 >> i))));
+            // n <= t exactly when the saturating difference is zero; the bit goes where it is not
+            const __m128i notAbove = _mm_cmpeq_epi8(_mm_subs_epu8(n[i], t), zero);
+            code = _mm_or_si128(code, _mm_andnot_si128(notAbove, _mm_set1_epi8(static_cast<char>(0x80 >> i))));
         }
         _mm_storeu_si128(reinterpret_cast<__m128i*>(target + x), code);
     }
     rmctRowScalar(above + x - 1, centre + x - 1, below + x - 1, target + x - 1, width - x + 1);
+}
+
+namespace {
+__attribute__((target("avx2"))) inline __m256i load(const unsigned char* p) {
+    return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p));
+}
+}  // namespace
+
+__attribute__((target("avx2"))) void rmctRowAvx2(const unsigned char* above, const unsigned char* centre,
+                                                 const unsigned char* below, unsigned char* target, int width) {
+    const __m256i zero = _mm256_setzero_si256();
+    int x = 1;
+    for (; x + 32 + 1 <= width; x += 32) {
+        const __m256i n[8] = {load(above + x - 1),  load(above + x),      load(above + x + 1), load(centre + x - 1),
+                              load(centre + x + 1), load(below + x - 1), load(below + x),     load(below + x + 1)};
+        __m256i low = _mm256_set1_epi16(kMargin), high = low;
+        for (int i = 0; i < 8; ++i) {
+            low = _mm256_add_epi16(low, _mm256_unpacklo_epi8(n[i], zero));
+            high = _mm256_add_epi16(high, _mm256_unpackhi_epi8(n[i], zero));
+        }
+        // unpack and pack both work within 128-bit halves, so the byte order comes back
+        const __m256i t = _mm256_packus_epi16(_mm256_srli_epi16(low, 3), _mm256_srli_epi16(high, 3));
+        __m256i code = zero;
+        for (int i = 0; i < 8; ++i) {
+            const __m256i notAbove = _mm256_cmpeq_epi8(_mm256_subs_epu8(n[i], t), zero);
+            code = _mm256_or_si256(code, _mm256_andnot_si256(notAbove, _mm256_set1_epi8(static_cast<char>(0x80 >> i))));
+        }
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(target + x), code);
+    }
+    rmctRowSse(above + x - 1, centre + x - 1, below + x - 1, target + x - 1, width - x + 1);
 }
 #endif
 
@@ -91,7 +121,8 @@ void rmctRow(const unsigned char* above, const unsigned char* centre, const unsi
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
     rmctRowNeon(above, centre, below, target, width);
 #elif defined(LQ_HAVE_SSSE3)
-    rmctRowSse(above, centre, below, target, width);
+    static const auto row = __builtin_cpu_supports("avx2") ? rmctRowAvx2 : rmctRowSse;
+    row(above, centre, below, target, width);
 #else
     rmctRowScalar(above, centre, below, target, width);
 #endif
@@ -102,8 +133,15 @@ void computeRmct(const Image& image, Image& rmct, const BaseRect<int>& rect) {
     LQ_ASSERT_COLOR_MODE(image, COLOR_MODE_MONO);
     const int width = image.width(), height = image.height();
     rmct.create(image.size(), COLOR_MODE_RMCT);
-    for (int y = 0; y < height; ++y) std::memset(rmct.row(y), 0, width);
-    if (width * height < 3) return;
+    if (width < 3 || height < 3) {
+        // no interior: the target stays all zero
+        for (int y = 0; y < height; ++y) std::memset(rmct.row(y), 0, width);
+        return;
+    }
+    // the rows write every interior code, so only the border lines need clearing
+    std::memset(rmct.row(0), 0, width);
+    std::memset(rmct.row(height - 1), 0, width);
+    for (int y = 1; y + 1 < height; ++y) rmct.row(y)[0] = rmct.row(y)[width - 1] = 0;
     BaseRect<int> clipped = rect.intersect(image.rect());
     if (clipped.area() <= 0) clipped = BaseRect<int>();
 

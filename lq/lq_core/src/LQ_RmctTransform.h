@@ -32,6 +32,9 @@ void rmctRowNeon(const unsigned char* above, const unsigned char* centre, const 
 // SSE2, which every x86-64 processor has
 void rmctRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
                 unsigned char* target, int width);
+// only where the processor has AVX2
+void rmctRowAvx2(const unsigned char* above, const unsigned char* centre, const unsigned char* below,
+                 unsigned char* target, int width);
 #endif
 
 }  // namespace LQ

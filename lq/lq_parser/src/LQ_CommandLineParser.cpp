@@ -97,8 +97,9 @@ void parseString(const std::string& text, std::vector<std::pair<std::string, std
     const std::vector<std::string> tokens = CommandLineParser::parseStream(stream);
     for (size_t i = 0; i < tokens.size(); ++i) {
         const std::string& token = tokens[i];
-        LQ_ASSERT_MSG(token[0] == '-', "cannot find key in " << text);
-        if (token.size() > 1 && token[1] != '-') {
+        // a lone "-" names no key either
+        LQ_ASSERT_MSG(token[0] == '-' && token.size() > 1, "cannot find key in " << text);
+        if (token[1] != '-') {
             std::string value;
             if (i + 1 < tokens.size() && tokens[i + 1][0] != '-') value = getRawValue(tokens[++i]);
             pairs.emplace_back(token.substr(1, 1), value);
@@ -234,15 +235,21 @@ void CommandLineParser::parseBase(const std::vector<std::string>& args) {
     checkRequiredKeysPresence();
 }
 
+std::vector<unsigned int> CommandLineParser::isSetAllRequired() const {
+    std::vector<unsigned int> missing;
+    for (const auto& entry : requiredKeys_)
+        if (!entry.second) missing.push_back(entry.first);
+    return missing;
+}
+
 void CommandLineParser::checkRequiredKeysPresence() const {
-    std::string missing;
-    for (const auto& entry : requiredKeys_) {
-        if (entry.second) continue;
-        const SingleKeyInfo& info = keysInfo_[entry.first];
-        if (!info.shortKey.empty()) missing += " '" + info.shortKey + "'";
-        if (!info.longKey.empty()) missing += " '" + info.longKey + "'";
+    std::string names;
+    for (const unsigned int index : isSetAllRequired()) {
+        const SingleKeyInfo& info = keysInfo_[index];
+        if (!info.shortKey.empty()) names += " '" + info.shortKey + "'";
+        if (!info.longKey.empty()) names += " '" + info.longKey + "'";
     }
-    LQ_ASSERT_MSG(missing.empty(), "some required key(s) missed:" << missing);
+    LQ_ASSERT_MSG(names.empty(), "some required key(s) missed:" << names);
 }
 
 bool CommandLineParser::isSet(const std::string& key) const {

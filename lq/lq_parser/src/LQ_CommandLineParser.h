@@ -38,6 +38,9 @@ public:
              int type, const std::string& description);
     void setDefaultValue(const std::string& longKey, const std::string& value);
 
+    // Each parse keeps its fixed argument list and adds to the values of earlier ones.
+    // "--help" prints the usage to stdout and ends the process with status 0; otherwise a
+    // required key that was never seen fails. argv[0] is the program and is skipped.
     void parse(int argc, const char* const* argv);
     void parse(const std::vector<std::string>& tokens);
     void parse(const std::string& text);
@@ -91,6 +94,8 @@ private:
     // The tokens behind the key at position into its value; false at a declared key.
     bool readArguments(const std::vector<std::string>& args, size_t position, unsigned int index);
     void insertArgument(unsigned int index);
+    // indices of the required keys not seen, in index order
+    std::vector<unsigned int> isSetAllRequired() const;
     void checkRequiredKeysPresence() const;
     static bool isNumeric(const std::string& text, bool allowPoint);
     unsigned int indexOf(const std::string& key, const char* before, const char* after) const;
