@@ -265,6 +265,20 @@ TEST(ColorConversion, HostVectorRowsEqualScalarRows) {
             LQ::rgbToYuvRowScalar(in.data(), scalar3.data(), width, 3, r);
             LQ::rgbToYuvRowSse(in.data(), vector3.data(), width, r);
             EXPECT_EQ(scalar3, vector3) << "to YUV, width " << width << " red at " << r;
+            if (avx2) {
+                LQ::rgbToYuvRowAvx2(in.data(), vector3.data(), width, r);
+                EXPECT_EQ(scalar3, vector3) << "to YUV AVX2, width " << width << " red at " << r;
+                const Bytes rgba = randomBytes(4 * width, random);
+                LQ::lumaRowScalar(rgba.data(), scalar.data(), width, 4, r, 1, 2 - r);
+                LQ::lumaRow4Avx2(rgba.data(), vector.data(), width, r);
+                EXPECT_EQ(scalar, vector) << "four-byte luma AVX2, width " << width << " red at " << r;
+            }
+            Bytes four(4 * width);
+            LQ::toFourRowSse(in.data(), four.data(), width, r);
+            for (int x = 0; x < width; ++x)
+                ASSERT_EQ((Bytes{four.begin() + 4 * x, four.begin() + 4 * x + 4}),
+                          (Bytes{in[3 * x + r], in[3 * x + 1], in[3 * x + 2 - r], 255}))
+                    << "to four bytes, width " << width << " at " << x;
             LQ::yuvToRgbRowScalar(in.data(), scalar3.data(), width, 3, r);
             LQ::yuvToRgbRowSse(in.data(), vector3.data(), width, r);
             EXPECT_EQ(scalar3, vector3) << "from YUV, width " << width << " red at " << r;
@@ -276,7 +290,23 @@ TEST(ColorConversion, HostVectorRowsEqualScalarRows) {
         Bytes first(width), spread(3 * width), swapped(3 * width);
         LQ::channelRowSse(in.data(), first.data(), width, 0);
         LQ::spreadRowSse(first.data(), spread.data(), width);
+        if (avx2) {
+            Bytes wide(3 * width);
+            LQ::spreadRowAvx2(first.data(), wide.data(), width);
+            EXPECT_EQ(spread, wide) << "spread AVX2, width " << width;
+        }
         LQ::swapRowSse(in.data(), swapped.data(), width);
+        if (avx2) {
+            Bytes wide(3 * width);
+            LQ::swapRowAvx2(in.data(), wide.data(), width);
+            EXPECT_EQ(swapped, wide) << "swap AVX2, width " << width;
+            // the row starts with pixels up to where the stores are aligned: try other starts
+            Bytes shifted(3 * width + 32);
+            for (int at : {1, 7, 16, 29}) {
+                LQ::swapRowAvx2(in.data(), shifted.data() + at, width);
+                EXPECT_EQ(swapped, Bytes(shifted.begin() + at, shifted.begin() + at + 3 * width)) << width << " at " << at;
+            }
+        }
         for (int x = 0; x < width; ++x) {
             ASSERT_EQ(first[x], in[3 * x]) << width;
             ASSERT_EQ(spread[3 * x + 1], in[3 * x]) << width;
@@ -293,6 +323,10 @@ TEST(ColorConversion, HostVectorRowsEqualScalarRows) {
                 LQ::nv21RowScalar(row.luma.data(), row.pairs.data(), scalar.data(), width, zoom, flip);
                 LQ::nv21RowSse(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
                 EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
+                if (avx2) {
+                    LQ::nv21RowAvx2(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
+                    EXPECT_EQ(scalar, vector) << "NV21 AVX2, width " << width << " zoom " << zoom << " flip " << flip;
+                }
             }
         }
     }

@@ -36,6 +36,18 @@ void compareLuma(Vector vectorRow, int step) {
 }
 
 template <class Vector>
+void compareEvenBytes(Vector vectorRow) {
+    std::mt19937 random(23);
+    for (int width = 1; width <= 99; ++width) {
+        const std::vector<unsigned char> in = randomBytes(2 * width, random);
+        std::vector<unsigned char> expected(width), actual(width);
+        LQ::evenBytesRowScalar(in.data(), expected.data(), width);
+        vectorRow(in.data(), actual.data(), width);
+        ASSERT_EQ(actual, expected) << "width " << width;
+    }
+}
+
+template <class Vector>
 void compareHalving(Vector vectorRow) {
     std::mt19937 random(11);
     for (int width = 1; width <= 99; ++width)
@@ -56,6 +68,7 @@ TEST(VectorKernels, NeonRowsEqualScalarRows) {
     compareLuma(LQ::lumaRowNeon, 3);
     compareLuma(LQ::lumaRowNeon, 4);
     compareHalving(LQ::zoomMonoTwiceRowNeon);
+    compareEvenBytes(LQ::evenBytesRowNeon);
 }
 #endif
 
@@ -65,6 +78,8 @@ TEST(VectorKernels, X86RowsEqualScalarRows) {
     compareLuma([](const unsigned char* in, unsigned char* out, int width, int, int r) { LQ::lumaRowSse(in, out, width, r); }, 3);
     compareHalving(LQ::zoomMonoTwiceRowSse);
     if (__builtin_cpu_supports("avx2")) compareHalving(LQ::zoomMonoTwiceRowAvx2);
+    compareEvenBytes(LQ::evenBytesRowSse);
+    if (__builtin_cpu_supports("avx2")) compareEvenBytes(LQ::evenBytesRowAvx2);
 
     if (__builtin_cpu_supports("avx2"))
         compareLuma([](const unsigned char* in, unsigned char* out, int width, int, int r) { LQ::lumaRowAvx2(in, out, width, r); }, 3);

@@ -39,8 +39,9 @@ TEST(CommandLineParser, GrammarOfLongAndShortKeys) {
     EXPECT_EQ(parser.getString("--scale"), "0.5=half");  // a second "=" stays in the value
     EXPECT_TRUE(parser.getBool("-f"));
     EXPECT_EQ(parser.getAllArgs(), (std::vector<std::string>{"--mode=\"thumb up\"", "-n", "-12", "--verbose",
-                                                              "--scale=0.5=half", "--flip=yes"}));
-    EXPECT_EQ(parser.getArgsString(), "--count=\"-12\" --flip=\"yes\" --mode=\"thumb up\" --scale=\"0.5=half\" --verbose=\"\" ");
+                                                             "--scale=0.5=half", "--flip=yes"}));
+    EXPECT_EQ(parser.getArgsString(),
+              "--count=\"-12\" --flip=\"yes\" --mode=\"thumb up\" --scale=\"0.5=half\" --verbose=\"\" ");
 
     // values read back by type, defaults where nothing was given
     CommandLineParser fresh = engineParser();
@@ -95,7 +96,8 @@ TEST(CommandLineParser, FailureTexts) {
     CommandLineParser parser = engineParser();
     parser.parse("--mode=x --scale=1.2.3 --flip=TRUE");
     EXPECT_EQ(catchCheck([&] { parser.getInt("--mode"); }).tail, "value for --mode: type of 'x' is not Int");
-    EXPECT_EQ(catchCheck([&] { parser.getInt("--scale"); }).tail, "value for --scale: type of '1.2.3' is not Int");
+    EXPECT_EQ(catchCheck([&] { parser.getInt("--scale"); }).tail,
+              "value for --scale: type of '1.2.3' is not Int");
     EXPECT_FLOAT_EQ(parser.getFloat("--scale"), 1.2f);  // the check passes, the stream reads what it can
     EXPECT_EQ(catchCheck([&] { parser.getBool("--flip"); }).tail, "convert error for the key '--flip'");
     EXPECT_EQ(catchCheck([&] { parser.getBool("--mode"); }).tail, "convert error for the key '--mode'");
@@ -110,13 +112,16 @@ TEST(CommandLineParser, FailureTexts) {
     CommandLineParser strict("head", "tail");
     strict.add("-r", "--required", "", true, 1, "must be there");
     strict.add("", "--also", "", true, 4, "this too");
-    EXPECT_EQ(catchCheck([&] { strict.parse("--also=1"); }).tail, "some required key(s) missed: '-r' '--required'");
+    EXPECT_EQ(catchCheck([&] { strict.parse("--also=1"); }).tail,
+              "some required key(s) missed: '-r' '--required'");
     strict.reset();
-    EXPECT_EQ(catchCheck([&] { strict.parse(""); }).tail, "some required key(s) missed: '-r' '--required' '--also'");
+    EXPECT_EQ(catchCheck([&] { strict.parse(""); }).tail,
+              "some required key(s) missed: '-r' '--required' '--also'");
 }
 
 TEST(CommandLineParser, ImportsCommentsAndUsage) {
-    const std::string inner = writeFile("tactus_inner.txt", "--count=7 # a comment --mode=ignored\n--verbose\n");
+    const std::string inner =
+        writeFile("tactus_inner.txt", "--count=7 # a comment --mode=ignored\n--verbose\n");
     const std::string outer = writeFile("tactus_outer.txt", "-i " + inner + "\n--mode=\"from file\"\n");
     CommandLineParser parser = engineParser();
     parser.parse("--import=" + outer + " --flip=1");
@@ -155,7 +160,8 @@ TEST(CommandLineParser, ImportsCommentsAndUsage) {
 
     std::vector<std::pair<std::string, std::string>> pairs;
     LQ::parseString("-a 1 -b --long=\"x y\" --bare", pairs);
-    EXPECT_EQ(pairs, (std::vector<std::pair<std::string, std::string>>{{"a", "1"}, {"b", ""}, {"long", "x y"}, {"bare", ""}}));
+    EXPECT_EQ(pairs, (std::vector<std::pair<std::string, std::string>>{
+                         {"a", "1"}, {"b", ""}, {"long", "x y"}, {"bare", ""}}));
     EXPECT_EQ(catchCheck([&] { LQ::parseString("-a 1 2", pairs); }).tail, "cannot find key in -a 1 2");
     EXPECT_EQ(catchCheck([&] { LQ::parseString("-", pairs); }).tail, "cannot find key in -");
 }

@@ -28,7 +28,8 @@ TEST(IniParser, SectionsLoadSaveAndMerge) {
         "scale=0.5\n");
     IniParser parser;
     EXPECT_EQ(parser.load(text), 0);
-    EXPECT_EQ(allKeys(parser), (std::vector<std::string>{"top", "camera/name", "camera/width", "detector/scale"}));
+    EXPECT_EQ(allKeys(parser),
+              (std::vector<std::string>{"top", "camera/name", "camera/width", "detector/scale"}));
     EXPECT_EQ(parser.getKey("camera/name", ""), "front cam");
     EXPECT_EQ(parser.getKey("top", ""), "1");
     EXPECT_TRUE(parser.hasKey("detector", "scale"));
@@ -113,7 +114,8 @@ TEST(IniParser, FirstBadLineAndItsError) {
 
     ::testing::internal::CaptureStderr();
     EXPECT_EQ(quoted.load("/nonexistent/settings.ini"), -1);
-    EXPECT_EQ(::testing::internal::GetCapturedStderr(), "[error] Cannot read file '/nonexistent/settings.ini'\n");
+    EXPECT_EQ(::testing::internal::GetCapturedStderr(),
+              "[error] Cannot read file '/nonexistent/settings.ini'\n");
     EXPECT_FALSE(quoted.save("/nonexistent/settings.ini"));
 }
 

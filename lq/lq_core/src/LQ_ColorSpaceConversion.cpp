@@ -1,5 +1,7 @@
 #include "LQ_ColorSpaceConversion.h"
 
+#include <algorithm>
+#include <cstdint>
 #include <cstring>
 
 #include "LQ_Depth.h"
@@ -81,6 +83,10 @@ void rgbToYuvAt(const Image& source, Image& target, const BaseRect<int>& area, i
         const unsigned char* in = source.pixel(area.left, y);
         unsigned char* out = target.pixel(area.left, y);
 #if defined(LQ_HAVE_SSSE3)
+        if (source.depth() == 3 && haveAvx2Cpu()) {
+            rgbToYuvRowAvx2(in, out, area.width(), r);
+            continue;
+        }
         if (source.depth() == 3 && haveSsse3Cpu()) {
             rgbToYuvRowSse(in, out, area.width(), r);
             continue;
@@ -120,8 +126,8 @@ void lumaOf(const Image& source, Image& target, const BaseRect<int>& area, int r
             continue;
         }
 #elif defined(LQ_HAVE_SSSE3)
-        if (step == 3 && g == 1 && (r == 0 || r == 2) && haveAvx2Cpu()) {
-            lumaRowAvx2(in, out, area.width(), r);
+        if (g == 1 && (r == 0 || r == 2) && haveAvx2Cpu()) {
+            step == 3 ? lumaRowAvx2(in, out, area.width(), r) : lumaRow4Avx2(in, out, area.width(), r);
             continue;
         }
         if (step == 3 && g == 1 && (r == 0 || r == 2) && haveSsse3Cpu()) {
@@ -225,15 +231,6 @@ alignas(16) const signed char kSwap3[16] = {2, 1, 0, 5, 4, 3, 8, 7, 6, 11, 10, 9
 }  // namespace
 
 namespace {
-__attribute__((target("avx2"))) inline __m256i channel32(const __m256i* parts, int c) {
-    const __m128i* m = reinterpret_cast<const __m128i*>(kDeinterleave3.masks[c]);
-    const __m256i m0 = _mm256_broadcastsi128_si256(_mm_load_si128(m));
-    const __m256i m1 = _mm256_broadcastsi128_si256(_mm_load_si128(m + 1));
-    const __m256i m2 = _mm256_broadcastsi128_si256(_mm_load_si128(m + 2));
-    return _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(parts[0], m0), _mm256_shuffle_epi8(parts[1], m1)),
-                           _mm256_shuffle_epi8(parts[2], m2));
-}
-
 __attribute__((target("avx2"))) inline __m256i luma16Avx(__m256i r, __m256i g, __m256i b) {
     const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_mullo_epi16(g, _mm256_set1_epi16(129)),
                                                           _mm256_mullo_epi16(r, _mm256_set1_epi16(66))),
@@ -241,27 +238,6 @@ __attribute__((target("avx2"))) inline __m256i luma16Avx(__m256i r, __m256i g, _
     return _mm256_add_epi16(_mm256_srli_epi16(sum, 8), _mm256_set1_epi16(16));
 }
 }  // namespace
-
-// 32 pixels a step: each 128-bit lane takes 16 of them, as the SSSE3 row does
-__attribute__((target("avx2"))) void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
-    const __m256i zero = _mm256_setzero_si256();
-    int x = 0;
-    for (; x + 32 <= width; x += 32) {
-        const unsigned char* p = in + 3 * x;
-        __m256i parts[3];
-        for (int k = 0; k < 3; ++k)
-            parts[k] = _mm256_inserti128_si256(
-                _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p + 16 * k))),
-                _mm_loadu_si128(reinterpret_cast<const __m128i*>(p + 48 + 16 * k)), 1);
-        const __m256i red = channel32(parts, r), green = channel32(parts, 1), blue = channel32(parts, 2 - r);
-        const __m256i low = luma16Avx(_mm256_unpacklo_epi8(red, zero), _mm256_unpacklo_epi8(green, zero),
-                                      _mm256_unpacklo_epi8(blue, zero));
-        const __m256i high = luma16Avx(_mm256_unpackhi_epi8(red, zero), _mm256_unpackhi_epi8(green, zero),
-                                       _mm256_unpackhi_epi8(blue, zero));
-        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_packus_epi16(low, high));
-    }
-    lumaRowSse(in + 3 * x, out + x, width - x, r);
-}
 
 namespace {
 // pshufb masks that place channel c's bytes into the three 16-byte parts of 16 pixels
@@ -295,10 +271,9 @@ __attribute__((target("ssse3"))) inline void loadPixels(const unsigned char* in,
     for (int c = 0; c < 3; ++c) channels[c] = channel(parts, c);
 }
 
-// one float channel of four pixels clamped to 0 .. 255 and truncated, as clampByte does
-__attribute__((target("ssse3"))) inline __m128i clampTruncate(__m128 value) {
-    return _mm_cvttps_epi32(_mm_min_ps(_mm_max_ps(value, _mm_setzero_ps()), _mm_set1_ps(255.f)));
-}
+// Truncated toward zero; the saturating packs that follow give clampByte's 0 and 255,
+// since the values stay within -500 .. 500.
+__attribute__((target("ssse3"))) inline __m128i clampTruncate(__m128 value) { return _mm_cvttps_epi32(value); }
 
 // ((a x + b y + c z) >> 8) + add on 16-bit lanes; the sums stay within 16 bits signed
 __attribute__((target("ssse3"))) inline __m128i weighted(__m128i x, __m128i y, __m128i z, short a, short b, short c,
@@ -337,43 +312,6 @@ __attribute__((target("ssse3"))) void yuvToRgbRowSse(const unsigned char* in, un
         storePixels(out + 3 * x, ordered);
     }
     yuvToRgbRowScalar(in + 3 * x, out + 3 * x, width - x, 3, r);
-}
-
-namespace {
-__attribute__((target("avx2"))) inline __m256i clampTruncate8(__m256 value) {
-    return _mm256_cvttps_epi32(_mm256_min_ps(_mm256_max_ps(value, _mm256_setzero_ps()), _mm256_set1_ps(255.f)));
-}
-// bytes 0..7 (half 0) or 8..15 (half 1) as floats
-__attribute__((target("avx2"))) inline __m256 floats8(__m128i bytes, int half) {
-    return _mm256_cvtepi32_ps(_mm256_cvtepu8_epi32(half ? _mm_srli_si128(bytes, 8) : bytes));
-}
-// eight 32-bit lanes to eight 16-bit lanes, in order
-__attribute__((target("avx2"))) inline __m128i narrow8(__m256i v) {
-    return _mm_packs_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1));
-}
-}  // namespace
-
-// the same as the SSSE3 row, with the float work eight pixels wide
-__attribute__((target("avx2"))) void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
-    int x = 0;
-    for (; x + 16 <= width; x += 16) {
-        __m128i yuv[3];
-        loadPixels(in + 3 * x, yuv);
-        __m128i rgb[3][2];
-        for (int h = 0; h < 2; ++h) {
-            const __m256 y = floats8(yuv[0], h), u = _mm256_sub_ps(floats8(yuv[1], h), _mm256_set1_ps(128.f)),
-                         v = _mm256_sub_ps(floats8(yuv[2], h), _mm256_set1_ps(128.f));
-            rgb[0][h] = narrow8(clampTruncate8(_mm256_add_ps(y, _mm256_mul_ps(v, _mm256_set1_ps(1.370705f)))));
-            rgb[1][h] = narrow8(clampTruncate8(_mm256_add_ps(_mm256_add_ps(y, _mm256_mul_ps(v, _mm256_set1_ps(-0.698001f))),
-                                                             _mm256_mul_ps(u, _mm256_set1_ps(-0.337633f)))));
-            rgb[2][h] = narrow8(clampTruncate8(_mm256_add_ps(y, _mm256_mul_ps(u, _mm256_set1_ps(1.732446f)))));
-        }
-        __m128i channels[3];
-        for (int c = 0; c < 3; ++c) channels[c] = _mm_packus_epi16(rgb[c][0], rgb[c][1]);
-        const __m128i ordered[3] = {channels[r == 0 ? 0 : 2], channels[1], channels[r == 0 ? 2 : 0]};
-        storePixels(out + 3 * x, ordered);
-    }
-    yuvToRgbRowSse(in + 3 * x, out + 3 * x, width - x, r);
 }
 
 __attribute__((target("ssse3"))) void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
@@ -449,6 +387,318 @@ __attribute__((target("ssse3"))) void lumaRowSse(const unsigned char* in, unsign
         _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x), _mm_packus_epi16(low, high));
     }
     lumaRowScalar(in + 3 * x, out + x, width - x, 3, r, 1, 2 - r);
+}
+
+// AVX2 rows take 32 pixels a step, 16 in each 128-bit lane, so that the SSSE3 shuffles
+// work lane by lane; three-byte pixels are loaded and stored with the lanes 48 bytes apart.
+namespace {
+struct Avx2Masks {
+    __m256i in[3][3], out[3][3], spread[3];
+};
+
+__attribute__((target("avx2"))) inline Avx2Masks avx2Masks() {
+    Avx2Masks m;
+    for (int c = 0; c < 3; ++c)
+        for (int k = 0; k < 3; ++k) {
+            m.in[c][k] = _mm256_broadcastsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(kDeinterleave3.masks[c][k])));
+            m.out[c][k] = _mm256_broadcastsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(kInterleave3.masks[c][k])));
+        }
+    for (int k = 0; k < 3; ++k)
+        m.spread[k] = _mm256_broadcastsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(kSpread3.masks[k])));
+    return m;
+}
+
+__attribute__((target("avx2"))) inline void load32x3(const unsigned char* in, const Avx2Masks& m, __m256i* channels) {
+    __m256i parts[3];
+    for (int k = 0; k < 3; ++k)
+        parts[k] = _mm256_inserti128_si256(_mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 16 * k))),
+                                           _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 48 + 16 * k)), 1);
+    for (int c = 0; c < 3; ++c)
+        channels[c] = _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(parts[0], m.in[c][0]), _mm256_shuffle_epi8(parts[1], m.in[c][1])),
+                                      _mm256_shuffle_epi8(parts[2], m.in[c][2]));
+}
+
+// parts[k] holds bytes 16k.. in lane 0 and 48 + 16k.. in lane 1
+__attribute__((target("avx2"))) inline void storeParts3(unsigned char* out, const __m256i* parts) {
+    _mm256_storeu_si256(reinterpret_cast<__m256i*>(out), _mm256_permute2x128_si256(parts[0], parts[1], 0x20));
+    _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + 32), _mm256_permute2x128_si256(parts[2], parts[0], 0x30));
+    _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + 64), _mm256_permute2x128_si256(parts[1], parts[2], 0x31));
+}
+
+__attribute__((target("avx2"))) inline void store32x3(unsigned char* out, const Avx2Masks& m, const __m256i* channels) {
+    __m256i parts[3];
+    for (int k = 0; k < 3; ++k)
+        parts[k] = _mm256_or_si256(_mm256_or_si256(_mm256_shuffle_epi8(channels[0], m.out[0][k]), _mm256_shuffle_epi8(channels[1], m.out[1][k])),
+                                   _mm256_shuffle_epi8(channels[2], m.out[2][k]));
+    storeParts3(out, parts);
+}
+
+// In-lane packs of four vectors of eight 32-bit values (pixels 0-7, 8-15, 16-23, 24-31)
+// leave the 4-byte groups in the order 0 2 4 6 1 3 5 7; this puts them back.
+__attribute__((target("avx2"))) inline __m256i packedInOrder(__m256i packed) {
+    return _mm256_permutevar8x32_epi32(packed, _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7));
+}
+
+__attribute__((target("avx2"))) inline __m256i weighted16(__m256i x, __m256i y, __m256i z, short a, short b, short c, short add) {
+    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_mullo_epi16(x, _mm256_set1_epi16(a)), _mm256_mullo_epi16(y, _mm256_set1_epi16(b))),
+                                         _mm256_mullo_epi16(z, _mm256_set1_epi16(c)));
+    return _mm256_add_epi16(_mm256_srai_epi16(sum, 8), _mm256_set1_epi16(add));
+}
+__attribute__((target("avx2"))) inline __m256i load256(const unsigned char* p) {
+    return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p));
+}
+
+// bytes 8 group .. 8 group + 7 of the 32
+__attribute__((target("avx2"))) inline __m128i eightBytes(__m256i v, int group) {
+    const __m128i lane = group < 2 ? _mm256_castsi256_si128(v) : _mm256_extracti128_si256(v, 1);
+    return group % 2 ? _mm_srli_si128(lane, 8) : lane;
+}
+
+// byte c of the 32-bit words of two vectors, as 16-bit lanes
+__attribute__((target("avx2"))) inline __m256i byteOfWords(const __m256i* words, int c) {
+    const __m128i count = _mm_cvtsi32_si128(8 * c);
+    const __m256i low = _mm256_set1_epi32(0xFF);
+    return _mm256_packs_epi32(_mm256_and_si256(_mm256_srl_epi32(words[0], count), low),
+                              _mm256_and_si256(_mm256_srl_epi32(words[1], count), low));
+}
+}  // namespace
+
+__attribute__((target("avx2"))) void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    const Avx2Masks m = avx2Masks();
+    const __m256i flipSign = _mm256_set1_epi8(-128);
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        __m256i yuv[3];
+        load32x3(in + 3 * x, m, yuv);
+        // a byte minus 128 is the byte with its top bit flipped, read as signed
+        const __m256i u = _mm256_xor_si256(yuv[1], flipSign), v = _mm256_xor_si256(yuv[2], flipSign);
+        __m256i rgb[3][4];
+        for (int group = 0; group < 4; ++group) {
+            const __m256 Y = _mm256_cvtepi32_ps(_mm256_cvtepu8_epi32(eightBytes(yuv[0], group)));
+            const __m256 U = _mm256_cvtepi32_ps(_mm256_cvtepi8_epi32(eightBytes(u, group)));
+            const __m256 V = _mm256_cvtepi32_ps(_mm256_cvtepi8_epi32(eightBytes(v, group)));
+            rgb[0][group] = _mm256_cvttps_epi32(_mm256_add_ps(Y, _mm256_mul_ps(V, _mm256_set1_ps(1.370705f))));
+            rgb[1][group] = _mm256_cvttps_epi32(_mm256_add_ps(_mm256_add_ps(Y, _mm256_mul_ps(V, _mm256_set1_ps(-0.698001f))),
+                                                              _mm256_mul_ps(U, _mm256_set1_ps(-0.337633f))));
+            rgb[2][group] = _mm256_cvttps_epi32(_mm256_add_ps(Y, _mm256_mul_ps(U, _mm256_set1_ps(1.732446f))));
+        }
+        __m256i channels[3];
+        for (int c = 0; c < 3; ++c)
+            channels[c] = packedInOrder(_mm256_packus_epi16(_mm256_packs_epi32(rgb[c][0], rgb[c][1]),
+                                                            _mm256_packs_epi32(rgb[c][2], rgb[c][3])));
+        const __m256i ordered[3] = {channels[r == 0 ? 0 : 2], channels[1], channels[r == 0 ? 2 : 0]};
+        store32x3(out + 3 * x, m, ordered);
+    }
+    yuvToRgbRowSse(in + 3 * x, out + 3 * x, width - x, r);
+}
+
+__attribute__((target("avx2"))) void rgbToYuvRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    const Avx2Masks m = avx2Masks();
+    const __m256i zero = _mm256_setzero_si256();
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        __m256i pixels[3];
+        load32x3(in + 3 * x, m, pixels);
+        const __m256i red = pixels[r], green = pixels[1], blue = pixels[2 - r];
+        __m256i yuv[3][2];
+        for (int h = 0; h < 2; ++h) {
+            const __m256i R = h ? _mm256_unpackhi_epi8(red, zero) : _mm256_unpacklo_epi8(red, zero);
+            const __m256i G = h ? _mm256_unpackhi_epi8(green, zero) : _mm256_unpacklo_epi8(green, zero);
+            const __m256i B = h ? _mm256_unpackhi_epi8(blue, zero) : _mm256_unpacklo_epi8(blue, zero);
+            yuv[0][h] = luma16Avx(R, G, B);
+            yuv[1][h] = weighted16(R, G, B, -38, -74, 112, 128);
+            yuv[2][h] = weighted16(R, G, B, 112, -94, -18, 128);
+        }
+        __m256i channels[3];
+        for (int c = 0; c < 3; ++c) channels[c] = _mm256_packus_epi16(yuv[c][0], yuv[c][1]);
+        store32x3(out + 3 * x, m, channels);
+    }
+    rgbToYuvRowSse(in + 3 * x, out + 3 * x, width - x, r);
+}
+
+__attribute__((target("avx2"))) void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    const Avx2Masks m = avx2Masks();
+    const __m256i zero = _mm256_setzero_si256();
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        __m256i pixels[3];
+        load32x3(in + 3 * x, m, pixels);
+        const __m256i red = pixels[r], green = pixels[1], blue = pixels[2 - r];
+        const __m256i low = luma16Avx(_mm256_unpacklo_epi8(red, zero), _mm256_unpacklo_epi8(green, zero),
+                                      _mm256_unpacklo_epi8(blue, zero));
+        const __m256i high = luma16Avx(_mm256_unpackhi_epi8(red, zero), _mm256_unpackhi_epi8(green, zero),
+                                       _mm256_unpackhi_epi8(blue, zero));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_packus_epi16(low, high));
+    }
+    lumaRowSse(in + 3 * x, out + x, width - x, r);
+}
+
+__attribute__((target("avx2"))) void lumaRow4Avx2(const unsigned char* in, unsigned char* out, int width, int r) {
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        __m256i words[4];
+        for (int k = 0; k < 4; ++k) words[k] = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 4 * x + 32 * k));
+        const __m256i first = luma16Avx(byteOfWords(words, r), byteOfWords(words, 1), byteOfWords(words, 2 - r));
+        const __m256i second = luma16Avx(byteOfWords(words + 2, r), byteOfWords(words + 2, 1), byteOfWords(words + 2, 2 - r));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), packedInOrder(_mm256_packus_epi16(first, second)));
+    }
+    lumaRowScalar(in + 4 * x, out + x, width - x, 4, r, 1, 2 - r);
+}
+
+__attribute__((target("avx2"))) void spreadRowAvx2(const unsigned char* in, unsigned char* out, int width) {
+    const Avx2Masks m = avx2Masks();
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const __m256i v = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + x));
+        const __m256i parts[3] = {_mm256_shuffle_epi8(v, m.spread[0]), _mm256_shuffle_epi8(v, m.spread[1]),
+                                  _mm256_shuffle_epi8(v, m.spread[2])};
+        storeParts3(out + 3 * x, parts);
+    }
+    spreadRowSse(in + x, out + 3 * x, width - x);
+}
+
+__attribute__((target("ssse3"))) void toFourRowSse(const unsigned char* in, unsigned char* out, int width, int r) {
+    // four pixels of 12 bytes into 16, red to byte 0, the fourth bytes cleared for alpha
+    const __m128i mask = r == 0 ? _mm_setr_epi8(0, 1, 2, -128, 3, 4, 5, -128, 6, 7, 8, -128, 9, 10, 11, -128)
+                                : _mm_setr_epi8(2, 1, 0, -128, 5, 4, 3, -128, 8, 7, 6, -128, 11, 10, 9, -128);
+    const __m128i alpha = _mm_set1_epi32(static_cast<int>(0xFF000000u));
+    int x = 0;
+    for (; x + 16 <= width; x += 16) {
+        const __m128i a = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x));
+        const __m128i b = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 16));
+        const __m128i c = _mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 3 * x + 32));
+        const __m128i groups[4] = {a, _mm_alignr_epi8(b, a, 12), _mm_alignr_epi8(c, b, 8), _mm_srli_si128(c, 4)};
+        for (int k = 0; k < 4; ++k)
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 4 * x + 16 * k),
+                             _mm_or_si128(_mm_shuffle_epi8(groups[k], mask), alpha));
+    }
+    for (; x < width; ++x) {
+        out[4 * x] = in[3 * x + r];
+        out[4 * x + 1] = in[3 * x + 1];
+        out[4 * x + 2] = in[3 * x + 2 - r];
+        out[4 * x + 3] = 255;
+    }
+}
+
+namespace {
+// Exchanging bytes 0 and 2 moves each byte by at most two: an output block is the input
+// block where the byte stays, the block two bytes on or two bytes back where it moves.
+// Which byte is which repeats every 96 bytes, three blocks of 32.
+struct SwapMasks {
+    alignas(32) unsigned char keep[3][32], next[3][32], back[3][32];
+    SwapMasks() {
+        for (int j = 0; j < 3; ++j)
+            for (int i = 0; i < 32; ++i) {
+                const int channel = (32 * j + i) % 3;
+                keep[j][i] = channel == 1 ? 0xFF : 0;
+                next[j][i] = channel == 0 ? 0xFF : 0;
+                back[j][i] = channel == 2 ? 0xFF : 0;
+            }
+    }
+};
+const SwapMasks kSwapMasks;
+}  // namespace
+
+__attribute__((target("avx2"))) void swapRowAvx2(const unsigned char* in, unsigned char* out, int width) {
+    __m256i keep[3], next[3], back[3];
+    for (int j = 0; j < 3; ++j) {
+        keep[j] = _mm256_load_si256(reinterpret_cast<const __m256i*>(kSwapMasks.keep[j]));
+        next[j] = _mm256_load_si256(reinterpret_cast<const __m256i*>(kSwapMasks.next[j]));
+        back[j] = _mm256_load_si256(reinterpret_cast<const __m256i*>(kSwapMasks.back[j]));
+    }
+    // A head of 1 to 32 pixels, until the stores are aligned to 32 bytes (3 x 11 = 1 mod 32):
+    // unaligned stores cost more than the loads here. The head also keeps the loads two
+    // bytes back inside the row, and the loop keeps one pixel after its 32 for those on.
+    int x = static_cast<int>((-11 * static_cast<long>(reinterpret_cast<uintptr_t>(out) % 32)) & 31);
+    if (x == 0) x = 32;
+    x = std::min(x, width);
+    swapRowSse(in, out, x);
+    for (; x + 33 <= width; x += 32) {
+        const unsigned char* p = in + 3 * x;
+        for (int j = 0; j < 3; ++j) {
+            const __m256i same = load256(p + 32 * j), after = load256(p + 32 * j + 2), before = load256(p + 32 * j - 2);
+            _mm256_store_si256(reinterpret_cast<__m256i*>(out + 3 * x + 32 * j),
+                                _mm256_or_si256(_mm256_or_si256(_mm256_and_si256(same, keep[j]), _mm256_and_si256(after, next[j])),
+                                                _mm256_and_si256(before, back[j])));
+        }
+    }
+    swapRowSse(in + 3 * x, out + 3 * x, width - x);
+}
+
+namespace {
+// pshufb masks that build the 48 bytes of 16 full-size pixels from 16 luma bytes and the
+// 16 bytes of their eight V, U pairs: part k = shuffle(luma, luma[k]) | shuffle(pairs, pairs[k])
+struct Nv21FullMasks {
+    alignas(16) signed char luma[3][16], pairs[3][16];
+    Nv21FullMasks() {
+        for (int k = 0; k < 3; ++k)
+            for (int i = 0; i < 16; ++i) {
+                const int at = 16 * k + i, pixel = at / 3, channel = at % 3;
+                luma[k][i] = static_cast<signed char>(channel == 0 ? pixel : -128);
+                pairs[k][i] = static_cast<signed char>(channel == 0 ? -128 : (pixel & ~1) + (channel == 1 ? 1 : 0));
+            }
+    }
+};
+const Nv21FullMasks kNv21Full;
+
+__attribute__((target("avx2"))) inline __m256i broadcastMask(const signed char* mask) {
+    return _mm256_broadcastsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(mask)));
+}
+
+// Full size: two shuffles per 16 output bytes, straight from the loaded rows.
+__attribute__((target("avx2"))) int nv21FullRowAvx2(const unsigned char* luma, const unsigned char* pairs,
+                                                     unsigned char* out, int width, bool flip) {
+    __m256i lumaMask[3], pairMask[3];
+    for (int k = 0; k < 3; ++k) lumaMask[k] = broadcastMask(kNv21Full.luma[k]), pairMask[k] = broadcastMask(kNv21Full.pairs[k]);
+    const __m256i reverse = _mm256_setr_epi8(15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0, 15, 14, 13, 12, 11, 10, 9, 8,
+                                             7, 6, 5, 4, 3, 2, 1, 0);
+    const __m256i reversePairs = _mm256_setr_epi8(14, 15, 12, 13, 10, 11, 8, 9, 6, 7, 4, 5, 2, 3, 0, 1, 14, 15, 12, 13, 10, 11,
+                                                  8, 9, 6, 7, 4, 5, 2, 3, 0, 1);
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const int s = flip ? width - x - 32 : x;
+        __m256i y = load256(luma + s), c = load256(pairs + s);
+        if (flip) {
+            y = _mm256_permute4x64_epi64(_mm256_shuffle_epi8(y, reverse), 0x4E);
+            c = _mm256_permute4x64_epi64(_mm256_shuffle_epi8(c, reversePairs), 0x4E);
+        }
+        __m256i parts[3];
+        for (int k = 0; k < 3; ++k)
+            parts[k] = _mm256_or_si256(_mm256_shuffle_epi8(y, lumaMask[k]), _mm256_shuffle_epi8(c, pairMask[k]));
+        storeParts3(out + 3 * x, parts);
+    }
+    return x;
+}
+}  // namespace
+
+__attribute__((target("avx2"))) void nv21RowAvx2(const unsigned char* luma, const unsigned char* pairs,
+                                                  unsigned char* out, int width, int zoom, bool flip) {
+    const __m256i low = _mm256_set1_epi16(0xFF);
+    const __m256i reverse = _mm256_broadcastsi128_si256(_mm_setr_epi8(15, 14, 13, 12, 11, 10, 9, 8, 7, 6, 5, 4, 3, 2, 1, 0));
+    if (zoom == 1 && flip && width % 2) return nv21RowSse(luma, pairs, out, width, zoom, flip);
+    int x = 0;
+    if (zoom == 1) {
+        x = nv21FullRowAvx2(luma, pairs, out, width, flip);
+    } else {
+        const Avx2Masks m = avx2Masks();
+        for (; x + 32 <= width; x += 32) {
+            const int s = 2 * (flip ? width - x - 32 : x);
+            // in-lane packs interleave the two loads' halves: 64-bit order 0 2 1 3
+            const __m256i l0 = load256(luma + s), l1 = load256(luma + s + 32);
+            const __m256i c0 = load256(pairs + s), c1 = load256(pairs + s + 32);
+            __m256i p[3];
+            p[0] = _mm256_permute4x64_epi64(_mm256_packus_epi16(_mm256_and_si256(l0, low), _mm256_and_si256(l1, low)), 0xD8);
+            p[1] = _mm256_permute4x64_epi64(_mm256_packus_epi16(_mm256_srli_epi16(c0, 8), _mm256_srli_epi16(c1, 8)), 0xD8);
+            p[2] = _mm256_permute4x64_epi64(_mm256_packus_epi16(_mm256_and_si256(c0, low), _mm256_and_si256(c1, low)), 0xD8);
+            if (flip)
+                for (int c = 0; c < 3; ++c) p[c] = _mm256_permute4x64_epi64(_mm256_shuffle_epi8(p[c], reverse), 0x4E);
+            store32x3(out + 3 * x, m, p);
+        }
+    }
+    if (flip)
+        nv21RowSse(luma, pairs, out + 3 * x, width - x, zoom, true);
+    else
+        nv21RowSse(luma + zoom * x, pairs + zoom * x, out + 3 * x, width - x, zoom, false);
 }
 #endif
 
@@ -541,8 +791,19 @@ void reorder(const Image& source, Image& target, const BaseRect<int>& area) {
 #if defined(LQ_HAVE_SSSE3)
     if constexpr (InStep == 3 && OutStep == 3 && c0 == 2 && c2 == 0 && !alpha) {
         if (haveSsse3Cpu()) {
+            for (int y = area.top; y < area.bottom; ++y) {
+                if (haveAvx2Cpu())
+                    swapRowAvx2(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+                else
+                    swapRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+            }
+            return;
+        }
+    }
+    if constexpr (InStep == 3 && OutStep == 4 && alpha) {
+        if (haveSsse3Cpu()) {
             for (int y = area.top; y < area.bottom; ++y)
-                swapRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+                toFourRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width(), c0);
             return;
         }
     }
@@ -559,8 +820,12 @@ void spread(const Image& source, Image& target, const BaseRect<int>& area) {
 #if defined(LQ_HAVE_SSSE3)
     if constexpr (OutStep == 3) {
         if (haveSsse3Cpu()) {
-            for (int y = area.top; y < area.bottom; ++y)
-                spreadRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+            for (int y = area.top; y < area.bottom; ++y) {
+                if (haveAvx2Cpu())
+                    spreadRowAvx2(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+                else
+                    spreadRowSse(source.pixel(area.left, y), target.pixel(area.left, y), area.width());
+            }
             return;
         }
     }
@@ -790,7 +1055,9 @@ void nv21ToYuvRows(const unsigned char* nv21, int width, int height, Image& targ
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
         nv21RowNeon(luma, pairs, target.row(y), target.width(), zoom, flip);
 #elif defined(LQ_HAVE_SSSE3)
-        if (haveSsse3Cpu())
+        if (haveAvx2Cpu())
+            nv21RowAvx2(luma, pairs, target.row(y), target.width(), zoom, flip);
+        else if (haveSsse3Cpu())
             nv21RowSse(luma, pairs, target.row(y), target.width(), zoom, flip);
         else
             nv21RowScalar(luma, pairs, target.row(y), target.width(), zoom, flip);
@@ -835,6 +1102,10 @@ void nv21ToMono(const unsigned char* nv21, const BaseSize<int>& size, Image& tar
     LQ_ASSERT_MSG(size.height % 2 == 0, "height must be even: " << size.height);
     LQ_ASSERT_MSG(size.width % 2 == 0, "width must be even: " << size.width);
     target.create(size, COLOR_MODE_MONO);
+    if (target.stripLength() == static_cast<unsigned>(size.width)) {
+        std::memcpy(target.data(), nv21, static_cast<size_t>(size.width) * size.height);
+        return;
+    }
     for (int y = 0; y < size.height; ++y) std::memcpy(target.row(y), nv21 + static_cast<size_t>(y) * size.width, size.width);
 }
 

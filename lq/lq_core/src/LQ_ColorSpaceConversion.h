@@ -78,23 +78,30 @@ void nv21RowNeon(const unsigned char* luma, const unsigned char* pairs, unsigned
 void yuvToMonoRowNeon(const unsigned char* in, unsigned char* out, int width);
 #endif
 #if defined(LQ_HAVE_SSSE3)
-// three-byte pixels; r is 0 or 2; needs SSSE3
+// x86 rows, 16 pixels a step with SSSE3 and 32 with AVX2; the caller checks the processor.
+// Three-byte pixels with red at byte r (0 or 2) to luma, and four-byte ones
 void lumaRowSse(const unsigned char* in, unsigned char* out, int width, int r);
-// the same, 32 pixels a step; needs AVX2
 void lumaRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
-// YUV to three-byte RGB (red at byte r) and back, 16 pixels a step; need SSSE3
+void lumaRow4Avx2(const unsigned char* in, unsigned char* out, int width, int r);
+// YUV to three-byte RGB (red at byte r) and back
 void yuvToRgbRowSse(const unsigned char* in, unsigned char* out, int width, int r);
-void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r);
 void yuvToRgbRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
-// needs SSSE3
-void nv21RowSse(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
-                bool flip);
+void rgbToYuvRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+void rgbToYuvRowAvx2(const unsigned char* in, unsigned char* out, int width, int r);
 // byte c of each three-byte pixel
 void channelRowSse(const unsigned char* in, unsigned char* out, int width, int c);
 // each byte into a three-byte pixel
 void spreadRowSse(const unsigned char* in, unsigned char* out, int width);
+void spreadRowAvx2(const unsigned char* in, unsigned char* out, int width);
 // bytes 0 and 2 of each three-byte pixel exchanged; in and out must not overlap
 void swapRowSse(const unsigned char* in, unsigned char* out, int width);
+void swapRowAvx2(const unsigned char* in, unsigned char* out, int width);
+// three-byte pixels to four: byte r, byte 1, byte 2 - r, then 255
+void toFourRowSse(const unsigned char* in, unsigned char* out, int width, int r);
+void nv21RowSse(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                bool flip);
+void nv21RowAvx2(const unsigned char* luma, const unsigned char* pairs, unsigned char* out, int width, int zoom,
+                 bool flip);
 #endif
 
 }  // namespace LQ

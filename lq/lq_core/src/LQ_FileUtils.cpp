@@ -51,13 +51,17 @@ std::string getFileNameBase(const std::string& path) {
     return name.substr(0, name.rfind('.'));
 }
 
-std::string fixSeparator(const std::string& path) { return replaceChar(path, '\\', '/'); }
+std::string fixSeparator(const std::string& path) {
+    return replaceChar(path, '\\', '/');
+}
 
 std::string fixPath(const std::string& path) {
     return replaceString("\"" + fixSeparator(path) + "\"", "$", "\\$");
 }
 
-bool isFileExists(const std::string& path) { return std::ifstream(path.c_str()).is_open(); }
+bool isFileExists(const std::string& path) {
+    return std::ifstream(path.c_str()).is_open();
+}
 
 bool isDirectory(const std::string& path) {
     DIR* directory = opendir(path.c_str());
@@ -145,8 +149,8 @@ void readFiles(const std::string& path, std::vector<std::string>& list, const st
     readFiles(path, list, std::vector<std::string>{extension}, recursive);
 }
 
-void readFiles(const std::string& path, std::vector<std::string>& list, const std::vector<std::string>& extensions,
-               bool recursive) {
+void readFiles(const std::string& path, std::vector<std::string>& list,
+               const std::vector<std::string>& extensions, bool recursive) {
     if (!isDirectory(path)) {
         if (isFileExists(path) && checkExtensions(path, extensions)) list.push_back(path);
         return;
@@ -170,8 +174,9 @@ void readVideos(const std::string& path, std::vector<std::string>& list, bool re
 }
 
 const std::vector<std::string>& getSupportedImageExtentions() {
-    static const std::vector<std::string> extensions{".jpg", ".png", ".pgm", ".jpeg", ".bmp", ".dib", ".jpe",
-                                                     ".pbm", ".ppm", ".tiff", ".tif", ".jp2", ".ascii"};
+    static const std::vector<std::string> extensions{".jpg", ".png", ".pgm",  ".jpeg", ".bmp",
+                                                     ".dib", ".jpe", ".pbm",  ".ppm",  ".tiff",
+                                                     ".tif", ".jp2", ".ascii"};
     return extensions;
 }
 

@@ -49,8 +49,8 @@ bool readDirectories(const std::string& path, std::vector<std::string>& list, bo
 // directory is appended itself when it can be read and passes.
 void readFiles(const std::string& path, std::vector<std::string>& list, const std::string& extension,
                bool recursive);
-void readFiles(const std::string& path, std::vector<std::string>& list, const std::vector<std::string>& extensions,
-               bool recursive);
+void readFiles(const std::string& path, std::vector<std::string>& list,
+               const std::vector<std::string>& extensions, bool recursive);
 void readImages(const std::string& path, std::vector<std::string>& list, bool recursive);
 void readVideos(const std::string& path, std::vector<std::string>& list, bool recursive);
 

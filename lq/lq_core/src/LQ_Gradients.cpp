@@ -53,7 +53,7 @@ void sobelRowNeon(const unsigned char* above, const unsigned char* centre, const
             const int16x8_t dc = vreinterpretq_s16_u16(vsubl_u8(half(c2), half(c0)));
             int16x8_t x16 = vreinterpretq_s16_u16(vsubl_u8(half(a2), half(a0)));
             x16 = vaddq_s16(x16, vreinterpretq_s16_u16(vsubl_u8(half(b2), half(b0))));
-            x16 = vaddq_s16(x16, vshlq_n_s16(dc, 1));
+            x16 = vaddq_s16(x16, vaddq_s16(dc, dc));  // not a shift: dc may be negative
             const uint16x8_t sumBelow = vaddq_u16(vaddl_u8(half(b0), half(b2)), vshll_n_u8(half(b1), 1));
             const uint16x8_t sumAbove = vaddq_u16(vaddl_u8(half(a0), half(a2)), vshll_n_u8(half(a1), 1));
             const int16x8_t y16 = vreinterpretq_s16_u16(vsubq_u16(sumBelow, sumAbove));

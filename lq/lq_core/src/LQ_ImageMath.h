@@ -5,11 +5,13 @@
 
 namespace LQ {
 
-// samples of a MONO, MONO16 or DEPTH image, in a 32-bit accumulator
+// Samples of a MONO, MONO16 or DEPTH image in a 32-bit accumulator; a rect of zero area
+// means the whole image.
 unsigned int imageSum(const Image& image, const BaseRect<int>& rect);
+// imageSum divided by the area
 float imageMean(const Image& image, const BaseRect<int>& rect);
-// Integer means into out: one byte for MONO, one 16-bit value for the 16-bit modes, one
-// byte per channel for the three-byte colour modes; zeros for an empty rect.
+// Integer means into out: one byte for MONO, one 16-bit value for MONO16 and DEPTH, one
+// byte per channel for the three-byte colour modes; zeros for a rect of zero area.
 void imageMean(const Image& image, unsigned char* out, const BaseRect<int>& rect);
 
 }  // namespace LQ

@@ -1,7 +1,9 @@
 #include "LQ_ImageResize.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <utility>
 #include <vector>
 
 #include "LQ_Integral.h"
@@ -9,44 +11,156 @@
 namespace LQ {
 
 namespace {
+
 BaseRect<int> wholeIfEmpty(const BaseRect<int>& rect, const Image& image) {
     return rect.area() == 0 ? image.rect() : rect;
 }
 
+bool isEmpty(const BaseRect<int>& rect) { return rect.width() <= 0 || rect.height() <= 0; }
+
+#if defined(LQ_HAVE_SSSE3)
+bool cpuHasSsse3() {
+    static const bool have = __builtin_cpu_supports("ssse3");
+    return have;
+}
+
+bool cpuHasAvx2() {
+    static const bool have = __builtin_cpu_supports("avx2");
+    return have;
+}
+#endif
+
+// The gather tables pay off only where a native vector unit reads them; NEON emulated on
+// x86 is slower than the scalar rows.
+bool vectorGather() {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    return true;
+#elif defined(LQ_HAVE_SSSE3)
+    return cpuHasSsse3();
+#else
+    return false;
+#endif
+}
+
 // start of each block and its length, one table for both axes
 void blockTables(int count, float zoom, std::vector<int>& shift, std::vector<int>& step) {
-    shift.resize(count);
+    const float stable = stableMultiplier<float>();
+    shift.resize(count + 1);
     step.resize(count);
-    for (int i = 0; i < count; ++i) shift[i] = static_cast<int>(i * zoom * stableMultiplier<float>());
-    for (int i = 0; i + 1 < count; ++i) step[i] = shift[i + 1] - shift[i];
+    for (int i = 0; i <= count; ++i) shift[i] = static_cast<int>(i * zoom * stable);
+    for (int i = 0; i < count; ++i) step[i] = shift[i + 1] - shift[i];
     if (count) step[count - 1] = 1;
 }
+
 }  // namespace
 
 // ---- halving -----------------------------------------------------------------------------
 
-void zoomMonoTwiceRowScalar(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+namespace {
+// (a + b + c + d) >> 2, or with Round (a + b + c + d + 2) >> 2, for pixels of C bytes
+template <int C, bool Round>
+void halveRow(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
     for (int x = 0; x < width; ++x)
-        out[x] = static_cast<unsigned char>((row0[2 * x] + row0[2 * x + 1] + row1[2 * x] + row1[2 * x + 1]) >> 2);
+        for (int c = 0; c < C; ++c) {
+            const int at = 2 * C * x + c;
+            out[C * x + c] =
+                static_cast<unsigned char>((row0[at] + row0[at + C] + row1[at] + row1[at + C] + (Round ? 2 : 0)) >> 2);
+        }
+}
+
+template <bool Round>
+void halveRowAny(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width, int channels) {
+    switch (channels) {
+        case 1: return halveRow<1, Round>(row0, row1, out, width);
+        case 2: return halveRow<2, Round>(row0, row1, out, width);
+        case 3: return halveRow<3, Round>(row0, row1, out, width);
+        case 4: return halveRow<4, Round>(row0, row1, out, width);
+        default: break;
+    }
+    for (int x = 0; x < width; ++x)
+        for (int c = 0; c < channels; ++c) {
+            const int at = 2 * channels * x + c;
+            out[channels * x + c] = static_cast<unsigned char>(
+                (row0[at] + row0[at + channels] + row1[at] + row1[at + channels] + (Round ? 2 : 0)) >> 2);
+        }
+}
+}  // namespace
+
+void zoomMonoTwiceRowScalar(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveRow<1, false>(row0, row1, out, width);
+}
+
+void zoomBgrTwiceRowScalar(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveRow<3, false>(row0, row1, out, width);
+}
+
+void halveRoundedRowScalar(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width,
+                           int channels) {
+    halveRowAny<true>(row0, row1, out, width, channels);
 }
 
 #if defined(LQ_HAVE_NEON)
-void zoomMonoTwiceRowNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+namespace {
+template <bool Round>
+inline uint8x8_t narrowQuarter(uint16x8_t sum) {
+    return Round ? vrshrn_n_u16(sum, 2) : vshrn_n_u16(sum, 2);
+}
+
+template <bool Round>
+void halveMonoNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
     int x = 0;
     for (; x + 16 <= width; x += 16) {
         // pairwise sums of each row, then the two rows, all in 16 bits
         const uint16x8_t low = vaddq_u16(vpaddlq_u8(vld1q_u8(row0 + 2 * x)), vpaddlq_u8(vld1q_u8(row1 + 2 * x)));
         const uint16x8_t high =
             vaddq_u16(vpaddlq_u8(vld1q_u8(row0 + 2 * x + 16)), vpaddlq_u8(vld1q_u8(row1 + 2 * x + 16)));
-        vst1q_u8(out + x, vcombine_u8(vshrn_n_u16(low, 2), vshrn_n_u16(high, 2)));
+        vst1q_u8(out + x, vcombine_u8(narrowQuarter<Round>(low), narrowQuarter<Round>(high)));
     }
-    zoomMonoTwiceRowScalar(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+    halveRow<1, Round>(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+}
+
+template <bool Round>
+void halveTriplesNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    int x = 0;
+    for (; x + 8 <= width; x += 8) {
+        // the loads split the channels, so each channel halves like a mono row
+        const uint8x16x3_t a = vld3q_u8(row0 + 6 * x), b = vld3q_u8(row1 + 6 * x);
+        uint8x8x3_t result;
+        for (int c = 0; c < 3; ++c)
+            result.val[c] = narrowQuarter<Round>(vaddq_u16(vpaddlq_u8(a.val[c]), vpaddlq_u8(b.val[c])));
+        vst3_u8(out + 3 * x, result);
+    }
+    halveRow<3, Round>(row0 + 6 * x, row1 + 6 * x, out + 3 * x, width - x);
+}
+}  // namespace
+
+void zoomMonoTwiceRowNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveMonoNeon<false>(row0, row1, out, width);
+}
+
+void zoomBgrTwiceRowNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveTriplesNeon<false>(row0, row1, out, width);
+}
+
+void halveRoundedRowNeon(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width,
+                         int channels) {
+    if (channels == 1) return halveMonoNeon<true>(row0, row1, out, width);
+    if (channels == 3) return halveTriplesNeon<true>(row0, row1, out, width);
+    halveRowAny<true>(row0, row1, out, width, channels);
 }
 #endif
 
 #if defined(LQ_HAVE_SSSE3)
-__attribute__((target("ssse3"))) void zoomMonoTwiceRowSse(const unsigned char* row0, const unsigned char* row1,
-                                                          unsigned char* out, int width) {
+namespace {
+// the 16-bit sums of four bytes, divided by 4
+template <bool Round>
+__attribute__((target("ssse3"))) inline __m128i quarter(__m128i sum) {
+    return _mm_srli_epi16(Round ? _mm_add_epi16(sum, _mm_set1_epi16(2)) : sum, 2);
+}
+
+template <bool Round>
+__attribute__((target("ssse3"))) void halveMonoSse(const unsigned char* row0, const unsigned char* row1,
+                                                   unsigned char* out, int width) {
     const __m128i ones = _mm_set1_epi8(1);
     int x = 0;
     for (; x + 16 <= width; x += 16) {
@@ -57,94 +171,175 @@ __attribute__((target("ssse3"))) void zoomMonoTwiceRowSse(const unsigned char* r
         const __m128i low = _mm_add_epi16(_mm_maddubs_epi16(a0, ones), _mm_maddubs_epi16(b0, ones));
         const __m128i high = _mm_add_epi16(_mm_maddubs_epi16(a1, ones), _mm_maddubs_epi16(b1, ones));
         _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x),
-                         _mm_packus_epi16(_mm_srli_epi16(low, 2), _mm_srli_epi16(high, 2)));
+                         _mm_packus_epi16(quarter<Round>(low), quarter<Round>(high)));
     }
-    zoomMonoTwiceRowScalar(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+    halveRow<1, Round>(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
 }
+
+// Two target pixels of three bytes from 12 bytes of each row: the shuffle puts the bytes
+// to be added side by side, the multiply-add sums the pairs. Six 16-bit results.
+template <bool Round>
+__attribute__((target("ssse3"))) inline __m128i halveTwoTriples(const unsigned char* a, const unsigned char* b) {
+    const __m128i pairs = _mm_setr_epi8(0, 3, 1, 4, 2, 5, 6, 9, 7, 10, 8, 11, -1, -1, -1, -1);
+    const __m128i ones = _mm_set1_epi8(1);
+    const __m128i top = _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(a)), pairs);
+    const __m128i bottom = _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(b)), pairs);
+    return quarter<Round>(_mm_add_epi16(_mm_maddubs_epi16(top, ones), _mm_maddubs_epi16(bottom, ones)));
+}
+
+template <bool Round>
+__attribute__((target("ssse3"))) void halveTriplesSse(const unsigned char* row0, const unsigned char* row1,
+                                                      unsigned char* out, int width) {
+    const __m128i compact = _mm_setr_epi8(0, 1, 2, 3, 4, 5, 8, 9, 10, 11, 12, 13, -1, -1, -1, -1);
+    int x = 0;
+    // four target pixels a step; the second loads reach 28 bytes into the step's 24
+    for (; x + 5 <= width; x += 4) {
+        const unsigned char* a = row0 + 6 * x;
+        const unsigned char* b = row1 + 6 * x;
+        const __m128i sums = _mm_packus_epi16(halveTwoTriples<Round>(a, b), halveTwoTriples<Round>(a + 12, b + 12));
+        const __m128i bytes = _mm_shuffle_epi8(sums, compact);
+        _mm_storel_epi64(reinterpret_cast<__m128i*>(out + 3 * x), bytes);
+        const int last = _mm_cvtsi128_si32(_mm_srli_si128(bytes, 8));
+        std::memcpy(out + 3 * x + 8, &last, 4);
+    }
+    halveRow<3, Round>(row0 + 6 * x, row1 + 6 * x, out + 3 * x, width - x);
+}
+}  // namespace
+
+void zoomMonoTwiceRowSse(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveMonoSse<false>(row0, row1, out, width);
+}
+
+void zoomBgrTwiceRowSse(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+    halveTriplesSse<false>(row0, row1, out, width);
+}
+
+void halveRoundedRowSse(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width,
+                        int channels) {
+    if (channels == 1) return halveMonoSse<true>(row0, row1, out, width);
+    if (channels == 3) return halveTriplesSse<true>(row0, row1, out, width);
+    halveRowAny<true>(row0, row1, out, width, channels);
+}
+
+// 32 target pixels a step; the packs work within 128-bit lanes, the permute puts the
+// two lanes' halves back in order
+namespace {
+// sums of the 16 byte pairs of 32 bytes
+__attribute__((target("avx2"))) inline __m256i pairs(const unsigned char* p) {
+    return _mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)), _mm256_set1_epi8(1));
+}
+}  // namespace
 
 __attribute__((target("avx2"))) void zoomMonoTwiceRowAvx2(const unsigned char* row0, const unsigned char* row1,
                                                           unsigned char* out, int width) {
-    const __m256i ones = _mm256_set1_epi8(1);
     int x = 0;
     for (; x + 32 <= width; x += 32) {
-        const __m256i low = _mm256_add_epi16(_mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row0 + 2 * x)), ones),
-                                             _mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row1 + 2 * x)), ones));
-        const __m256i high = _mm256_add_epi16(_mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row0 + 2 * x + 32)), ones),
-                                              _mm256_maddubs_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(row1 + 2 * x + 32)), ones));
-        // packing works per 128-bit lane: put the quarters back in order
-        const __m256i packed = _mm256_packus_epi16(_mm256_srli_epi16(low, 2), _mm256_srli_epi16(high, 2));
-        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(packed, 0xD8));
+        const __m256i low = _mm256_srli_epi16(_mm256_add_epi16(pairs(row0 + 2 * x), pairs(row1 + 2 * x)), 2);
+        const __m256i high = _mm256_srli_epi16(_mm256_add_epi16(pairs(row0 + 2 * x + 32), pairs(row1 + 2 * x + 32)), 2);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x),
+                            _mm256_permute4x64_epi64(_mm256_packus_epi16(low, high), 0xD8));
     }
-    zoomMonoTwiceRowSse(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+    // the SSE code after this would pay for the upper halves left dirty
+    _mm256_zeroupper();
+    halveMonoSse<false>(row0 + 2 * x, row1 + 2 * x, out + x, width - x);
+}
+#endif
+
+// ---- every second byte ----------------------------------------------------------------------
+
+void evenBytesRowScalar(const unsigned char* in, unsigned char* out, int width) {
+    for (int x = 0; x < width; ++x) out[x] = in[2 * x];
 }
 
-// out[x] = in[2x]: the nearest resize at exactly half the width
-__attribute__((target("avx2"))) void evenBytesRowAvx2(const unsigned char* in, unsigned char* out, int width) {
-    const __m256i mask = _mm256_set1_epi16(0x00FF);
+#if defined(LQ_HAVE_NEON)
+void evenBytesRowNeon(const unsigned char* in, unsigned char* out, int width) {
     int x = 0;
-    for (; x + 32 <= width; x += 32) {
-        const __m256i a = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x)), mask);
-        const __m256i b = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x + 32)), mask);
-        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(_mm256_packus_epi16(a, b), 0xD8));
-    }
-    evenBytesRowSse(in + 2 * x, out + x, width - x);
+    for (; x + 16 <= width; x += 16) vst1q_u8(out + x, vld2q_u8(in + 2 * x).val[0]);
+    evenBytesRowScalar(in + 2 * x, out + x, width - x);
 }
+#endif
 
+#if defined(LQ_HAVE_SSSE3)
 void evenBytesRowSse(const unsigned char* in, unsigned char* out, int width) {
-    const __m128i mask = _mm_set1_epi16(0x00FF);
+    const __m128i low = _mm_set1_epi16(0x00FF);
     int x = 0;
     for (; x + 16 <= width; x += 16) {
-        const __m128i a = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x)), mask);
-        const __m128i b = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x + 16)), mask);
+        const __m128i a = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x)), low);
+        const __m128i b = _mm_and_si128(_mm_loadu_si128(reinterpret_cast<const __m128i*>(in + 2 * x + 16)), low);
         _mm_storeu_si128(reinterpret_cast<__m128i*>(out + x), _mm_packus_epi16(a, b));
     }
-    for (; x < width; ++x) out[x] = in[2 * x];
+    evenBytesRowScalar(in + 2 * x, out + x, width - x);
 }
 
-namespace {
-bool haveSsse3Cpu() {
-    static const bool have = __builtin_cpu_supports("ssse3");
-    return have;
+__attribute__((target("avx2"))) void evenBytesRowAvx2(const unsigned char* in, unsigned char* out, int width) {
+    const __m256i low = _mm256_set1_epi16(0x00FF);
+    int x = 0;
+    for (; x + 32 <= width; x += 32) {
+        const __m256i a = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x)), low);
+        const __m256i b = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * x + 32)), low);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + x), _mm256_permute4x64_epi64(_mm256_packus_epi16(a, b), 0xD8));
+    }
+    _mm256_zeroupper();
+    evenBytesRowSse(in + 2 * x, out + x, width - x);
 }
-bool haveAvx2Cpu() {
-    static const bool have = __builtin_cpu_supports("avx2");
-    return have;
+#endif
+
+namespace {
+void zoomMonoTwiceRow(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    zoomMonoTwiceRowNeon(row0, row1, out, width);
+#else
+#if defined(LQ_HAVE_SSSE3)
+    if (cpuHasAvx2()) return zoomMonoTwiceRowAvx2(row0, row1, out, width);
+    if (cpuHasSsse3()) return zoomMonoTwiceRowSse(row0, row1, out, width);
+#endif
+    zoomMonoTwiceRowScalar(row0, row1, out, width);
+#endif
+}
+
+void halveRoundedRow(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width,
+                     int channels) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    halveRoundedRowNeon(row0, row1, out, width, channels);
+#else
+#if defined(LQ_HAVE_SSSE3)
+    if (cpuHasSsse3()) return halveRoundedRowSse(row0, row1, out, width, channels);
+#endif
+    halveRoundedRowScalar(row0, row1, out, width, channels);
+#endif
+}
+
+void zoomBgrTwiceRow(const unsigned char* row0, const unsigned char* row1, unsigned char* out, int width) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    zoomBgrTwiceRowNeon(row0, row1, out, width);
+#else
+#if defined(LQ_HAVE_SSSE3)
+    if (cpuHasSsse3()) return zoomBgrTwiceRowSse(row0, row1, out, width);
+#endif
+    zoomBgrTwiceRowScalar(row0, row1, out, width);
+#endif
 }
 }  // namespace
-#endif
 
 void zoomMonoTwice(int width, int height, const unsigned char* source, unsigned char* target, int sourceStride,
                    int targetStride) {
     for (int y = 0; y < height; ++y) {
         const unsigned char* row0 = source + static_cast<ptrdiff_t>(2 * y) * sourceStride;
-        unsigned char* out = target + static_cast<ptrdiff_t>(y) * targetStride;
-#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
-        zoomMonoTwiceRowNeon(row0, row0 + sourceStride, out, width);
-#elif defined(LQ_HAVE_SSSE3)
-        if (haveAvx2Cpu())
-            zoomMonoTwiceRowAvx2(row0, row0 + sourceStride, out, width);
-        else if (haveSsse3Cpu())
-            zoomMonoTwiceRowSse(row0, row0 + sourceStride, out, width);
-        else
-            zoomMonoTwiceRowScalar(row0, row0 + sourceStride, out, width);
-#else
-        zoomMonoTwiceRowScalar(row0, row0 + sourceStride, out, width);
-#endif
+        zoomMonoTwiceRow(row0, row0 + sourceStride, target + static_cast<ptrdiff_t>(y) * targetStride, width);
     }
 }
 
 void zoomImageTwice(int width, int height, const unsigned char* source, unsigned char* target, int sourceStride,
                     int targetStride, int channels) {
-    const int rowBytes = width * channels;
+    if (channels == 1) return zoomMonoTwice(width, height, source, target, sourceStride, targetStride);
     for (int y = 0; y < height; ++y) {
         const unsigned char* row0 = source + static_cast<ptrdiff_t>(2 * y) * sourceStride;
         const unsigned char* row1 = row0 + sourceStride;
         unsigned char* out = target + static_cast<ptrdiff_t>(y) * targetStride;
-        for (int i = 0; i < rowBytes; ++i) {
-            const int x = i / channels, c = i - x * channels;
-            const int at = 2 * x * channels + c;
-            out[i] = static_cast<unsigned char>((row0[at] + row0[at + channels] + row1[at] + row1[at + channels]) >> 2);
-        }
+        if (channels == 3)
+            zoomBgrTwiceRow(row0, row1, out, width);
+        else
+            halveRowAny<false>(row0, row1, out, width, channels);
     }
 }
 
@@ -167,33 +362,69 @@ void zoomDepthTwice(int width, int height, const unsigned char* source, unsigned
 }
 
 void zoomImageTwice(const Image& source, Image& target, BaseRect<int> targetRect) {
+    if (&source == &target) {
+        const Image copy(source);
+        return zoomImageTwice(copy, target, targetRect);
+    }
     LQ_ASSERT_CREATED(source);
-    target.create(BaseSize<int>(source.width() / 2, source.height() / 2), source.colorMode());
+    const ColorMode mode = source.colorMode();
+    LQ_ASSERT_MSG(mode == COLOR_MODE_MONO || mode == COLOR_MODE_DEPTH || isColor(mode),
+                  "color mode is not supported: " << mode);
+    target.create(BaseSize<int>(source.width() / 2, source.height() / 2), mode);
     LQ_ASSERT_CONTAINS(target.rect(), targetRect);
     targetRect = wholeIfEmpty(targetRect, target);
-    if (targetRect.area() <= 0) return;
+    if (isEmpty(targetRect)) return;
     const unsigned char* in = source.pixel(2 * targetRect.left, 2 * targetRect.top);
     unsigned char* out = target.pixel(targetRect.left, targetRect.top);
     const int sourceStride = static_cast<int>(source.stripLength());
     const int targetStride = static_cast<int>(target.stripLength());
-    const ColorMode mode = source.colorMode();
-    if (mode == COLOR_MODE_MONO)
-        zoomMonoTwice(targetRect.width(), targetRect.height(), in, out, sourceStride, targetStride);
-    else if (mode == COLOR_MODE_DEPTH)
+    if (mode == COLOR_MODE_DEPTH)
         zoomDepthTwice(targetRect.width(), targetRect.height(), in, out, sourceStride, targetStride);
-    else if (isColor(mode))
-        zoomImageTwice(targetRect.width(), targetRect.height(), in, out, sourceStride, targetStride, source.depth());
     else
-        LQ_FAIL("color mode is not supported: " << mode);
+        zoomImageTwice(targetRect.width(), targetRect.height(), in, out, sourceStride, targetStride, source.depth());
 }
 
 // ---- averaging ----------------------------------------------------------------------------
 
+namespace {
+template <int C>
+void averageBlocks(const Image& source, Image& target, const BaseRect<int>& rect, const std::vector<int>& shift,
+                   const std::vector<int>& step) {
+    const size_t stride = source.stripLength();
+    for (int y = rect.top; y < rect.bottom; ++y) {
+        unsigned char* out = target.row(y);
+        const int rows = step[y];
+        for (int x = rect.left; x < rect.right; ++x) {
+            const unsigned char* corner = source.pixel(shift[x], shift[y]);
+            const int columns = step[x];
+            const int area = columns * rows;
+            if (area == 1) {
+                for (int c = 0; c < C; ++c) out[x * C + c] = corner[c];
+                continue;
+            }
+            unsigned int sums[C] = {};
+            for (int j = 0; j < rows; ++j) {
+                const unsigned char* in = corner + j * stride;
+                for (int i = 0; i < columns; ++i)
+                    for (int c = 0; c < C; ++c) sums[c] += in[i * C + c];
+            }
+            for (int c = 0; c < C; ++c)
+                out[x * C + c] = static_cast<unsigned char>(area > 0 ? sums[c] / static_cast<unsigned>(area) : 0);
+        }
+    }
+}
+}  // namespace
+
 void zoomImageAverage(const Image& source, Image& target, float zoom, BaseRect<int> targetRect) {
+    if (&source == &target) {
+        const Image copy(source);
+        return zoomImageAverage(copy, target, zoom, targetRect);
+    }
     LQ_ASSERT_CREATED(source);
-    LQ_ASSERT_MSG(source.colorMode() == COLOR_MODE_MONO || isColor(source.colorMode()) ||
-                      source.colorMode() == COLOR_MODE_DEPTH,
-                  "color mode is not supported: " << source.colorMode());
+    const ColorMode mode = source.colorMode();
+    // depth passes this one so that it meets its own check
+    LQ_ASSERT_MSG(mode == COLOR_MODE_MONO || mode == COLOR_MODE_DEPTH || isColor(mode),
+                  "color mode is not supported: " << mode);
     LQ_ASSERT_NE(source.colorMode(), COLOR_MODE_DEPTH);
     LQ_ASSERT_GT(zoom, 1.f);
     const int numChannels = source.depth();
@@ -201,31 +432,25 @@ void zoomImageAverage(const Image& source, Image& target, float zoom, BaseRect<i
     const float stable = stableMultiplier<float>();
     target.create(BaseSize<int>(static_cast<int>(source.width() / zoom * stable),
                                 static_cast<int>(source.height() / zoom * stable)),
-                  source.colorMode());
+                  mode);
     LQ_ASSERT_CONTAINS(target.rect(), targetRect);
     targetRect = wholeIfEmpty(targetRect, target);
+    if (isEmpty(targetRect)) return;
     std::vector<int> shift, step;
     blockTables(std::max(target.width(), target.height()), zoom, shift, step);
-    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
-        unsigned char* out = target.row(y);
-        for (int x = targetRect.left; x < targetRect.right; ++x) {
-            const int area = step[x] * step[y];
-            const unsigned char* corner = source.pixel(shift[x], shift[y]);
-            for (int c = 0; c < numChannels; ++c) {
-                if (area == 1) {
-                    out[x * numChannels + c] = corner[c];
-                    continue;
-                }
-                unsigned int sum = 0;
-                for (int j = 0; j < step[y]; ++j) {
-                    const unsigned char* row = corner + static_cast<ptrdiff_t>(j) * source.stripLength();
-                    for (int i = 0; i < step[x]; ++i) sum += row[i * numChannels + c];
-                }
-                out[x * numChannels + c] = area > 0 ? static_cast<unsigned char>(sum / area) : 0;
-            }
-        }
+    switch (numChannels) {
+        case 1: averageBlocks<1>(source, target, targetRect, shift, step); break;
+        case 3: averageBlocks<3>(source, target, targetRect, shift, step); break;
+        default: averageBlocks<4>(source, target, targetRect, shift, step); break;
     }
 }
+
+namespace {
+// the check in the integral's own pixels, under the rectangle's own name
+void checkInIntegral(const Image& integral, const BaseRect<int>& targetRect) {
+    LQ_ASSERT_CONTAINS(integralRect(integral), targetRect);
+}
+}  // namespace
 
 void zoomImageIntegral(const Image& integral, Image& target, float zoom, BaseRect<int> targetRect) {
     LQ_ASSERT_COLOR_MODE(integral, COLOR_MODE_INTEGRAL);
@@ -235,13 +460,9 @@ void zoomImageIntegral(const Image& integral, Image& target, float zoom, BaseRec
                                 static_cast<int>((integral.height() - 1) / zoom * stable)),
                   COLOR_MODE_MONO);
     targetRect = wholeIfEmpty(targetRect, target);
-    {
-        // the rectangle in the integral's own pixels
-        const BaseRect<int> targetRect_ = targetRect / (1.f / zoom);
-        const BaseRect<int>& targetRect = targetRect_;
-        LQ_ASSERT_CONTAINS(integralRect(integral), targetRect);
-    }
+    checkInIntegral(integral, targetRect / (1.f / zoom));
     LQ_ASSERT_CONTAINS(target.rect(), targetRect);
+    if (isEmpty(targetRect)) return;
     std::vector<int> shift, step;
     blockTables(std::max(target.width(), target.height()), zoom, shift, step);
     for (int y = targetRect.top; y < targetRect.bottom; ++y) {
@@ -257,118 +478,365 @@ void zoomImageIntegral(const Image& integral, Image& target, float zoom, BaseRec
     }
 }
 
-// ---- bilinear and nearest ------------------------------------------------------------------
+// ---- gathers ------------------------------------------------------------------------------
 
-#if defined(LQ_HAVE_SSSE3)
+void GatherTable::build(const int* offsets, int blocks, int rowBytes) {
+    base_.assign(blocks, 0);
+    windows_.assign(blocks, 0);
+    index_.assign(16 * static_cast<size_t>(blocks), 0);
+    for (int b = 0; b < blocks; ++b) {
+        const int* o = offsets + 16 * b;
+        const int low = *std::min_element(o, o + 16), high = *std::max_element(o, o + 16);
+        const int windows = (high - low) / 16 + 1;
+        if (windows > 4) continue;
+        // moved left at the end of the row; the bytes still lie inside the windows
+        const int start = std::min(low, rowBytes - 16 * windows);
+        if (start < 0) continue;
+        base_[b] = start;
+        windows_[b] = static_cast<unsigned char>(windows);
+        for (int j = 0; j < 16; ++j) index_[16 * b + j] = static_cast<unsigned char>(o[j] - start);
+    }
+}
+
+void gatherRowScalar(const unsigned char* row, const int* offsets, unsigned char* out, int count) {
+    for (int i = 0; i < count; ++i) out[i] = row[offsets[i]];
+}
+
+#if defined(LQ_HAVE_NEON)
 namespace {
-// Byte images, eight target columns a step. Per step one 16-byte load from the row holds
-// both neighbours of all eight columns when they lie close enough together (a scale
-// above about 0.6); byte shuffles made once per call pick them out into 16-bit lanes. All
-// sums fit 16 bits: (256 - f) a + f b is at most 256 x 255.
-struct Lanes {
-    alignas(16) unsigned char bytes[16];
-};
-struct MonoBlocks {
-    std::vector<int> base;  // first byte of each step's load
-    std::vector<Lanes> left, right, fraction;
-    int count = 0;                         // whole steps from the rectangle's left edge
-};
-
-__attribute__((target("ssse3"))) MonoBlocks monoBlocks(const std::vector<int>& left, const std::vector<int>& right,
-                                                      const std::vector<int>& fraction, int rowBytes) {
-    MonoBlocks blocks;
-    const int columns = static_cast<int>(left.size());
-    for (int k = 0; k + 8 <= columns; k += 8) {
-        const int base = left[k];
-        if (right[k + 7] - base >= 16 || base + 16 > rowBytes) break;
-        Lanes a, b, f;
-        for (int j = 0; j < 8; ++j) {
-            a.bytes[2 * j] = static_cast<unsigned char>(left[k + j] - base), a.bytes[2 * j + 1] = 0x80;
-            b.bytes[2 * j] = static_cast<unsigned char>(right[k + j] - base), b.bytes[2 * j + 1] = 0x80;
-            f.bytes[2 * j] = static_cast<unsigned char>(fraction[k + j]), f.bytes[2 * j + 1] = 0;
+// the 16 bytes of a block with 1 to 4 windows from p
+inline uint8x16_t gather16Neon(const unsigned char* p, int windows, const unsigned char* indices) {
+    const uint8x16_t index = vld1q_u8(indices);
+    switch (windows) {
+        case 1: return vqtbl1q_u8(vld1q_u8(p), index);
+        case 2: {
+            const uint8x16x2_t w = {{vld1q_u8(p), vld1q_u8(p + 16)}};
+            return vqtbl2q_u8(w, index);
         }
-        blocks.base.push_back(base);
-        blocks.left.push_back(a);
-        blocks.right.push_back(b);
-        blocks.fraction.push_back(f);
-        blocks.count += 8;
-    }
-    return blocks;
-}
-
-__attribute__((target("ssse3"))) inline __m128i across(const unsigned char* row, const MonoBlocks& blocks, int k) {
-    const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row + blocks.base[k]));
-    const auto lanes = [](const Lanes& l) { return _mm_load_si128(reinterpret_cast<const __m128i*>(l.bytes)); };
-    const __m128i a = _mm_shuffle_epi8(v, lanes(blocks.left[k])), b = _mm_shuffle_epi8(v, lanes(blocks.right[k]));
-    const __m128i f = lanes(blocks.fraction[k]);
-    const __m128i sum = _mm_add_epi16(_mm_mullo_epi16(_mm_sub_epi16(_mm_set1_epi16(256), f), a), _mm_mullo_epi16(f, b));
-    return _mm_srli_epi16(sum, 8);
-}
-
-// the whole steps of one target row; returns how many columns were done
-__attribute__((target("ssse3"))) int bilinearMonoRowSse(const unsigned char* upper, const unsigned char* lower,
-                                                        const MonoBlocks& blocks, int fy, unsigned char* out) {
-    const __m128i down = _mm_set1_epi16(static_cast<short>(fy)), up = _mm_set1_epi16(static_cast<short>(256 - fy));
-    for (int k = 0; k < blocks.count / 8; k += 2) {
-        __m128i result[2] = {_mm_setzero_si128(), _mm_setzero_si128()};
-        for (int h = 0; h < 2 && k + h < blocks.count / 8; ++h) {
-            const __m128i top = across(upper, blocks, k + h), bottom = across(lower, blocks, k + h);
-            result[h] = _mm_srli_epi16(_mm_add_epi16(_mm_mullo_epi16(up, top), _mm_mullo_epi16(down, bottom)), 8);
+        case 3: {
+            const uint8x16x3_t w = {{vld1q_u8(p), vld1q_u8(p + 16), vld1q_u8(p + 32)}};
+            return vqtbl3q_u8(w, index);
         }
-        const __m128i packed = _mm_packus_epi16(result[0], result[1]);
-        if (k + 1 < blocks.count / 8)
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 8 * k), packed);
-        else
-            _mm_storel_epi64(reinterpret_cast<__m128i*>(out + 8 * k), packed);
+        default: {
+            const uint8x16x4_t w = {{vld1q_u8(p), vld1q_u8(p + 16), vld1q_u8(p + 32), vld1q_u8(p + 48)}};
+            return vqtbl4q_u8(w, index);
+        }
     }
-    return blocks.count;
-}
-
-bool haveSsse3ForResize() {
-    static const bool have = __builtin_cpu_supports("ssse3");
-    return have;
 }
 }  // namespace
+
+void gatherRowNeon(const unsigned char* row, const GatherTable& table, const int* offsets, unsigned char* out,
+                   int count) {
+    const int blocks = std::min(table.blocks(), count / 16);
+    const int* base = table.bases();
+    const unsigned char* windows = table.windowCounts();
+    const unsigned char* index = table.indices();
+    for (int b = 0; b < blocks; ++b) {
+        if (windows[b])
+            vst1q_u8(out + 16 * b, gather16Neon(row + base[b], windows[b], index + 16 * b));
+        else
+            gatherRowScalar(row, offsets + 16 * b, out + 16 * b, 16);
+    }
+    gatherRowScalar(row, offsets + 16 * blocks, out + 16 * blocks, count - 16 * blocks);
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+// the 16 bytes of a block with 1 to 4 windows from p
+__attribute__((target("ssse3"))) inline __m128i gather16Sse(const unsigned char* p, int windows,
+                                                             const unsigned char* indices) {
+    __m128i index = _mm_loadu_si128(reinterpret_cast<const __m128i*>(indices));
+    if (windows == 1) return _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p)), index);
+    const __m128i fifteen = _mm_set1_epi8(15), sixteen = _mm_set1_epi8(16);
+    __m128i result = _mm_setzero_si128();
+    for (int w = 0; w < windows; ++w) {
+        // bytes of other windows get the top bit, which makes the shuffle write 0
+        const __m128i picked = _mm_or_si128(index, _mm_cmpgt_epi8(index, fifteen));
+        result = _mm_or_si128(result,
+                              _mm_shuffle_epi8(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p + 16 * w)), picked));
+        index = _mm_sub_epi8(index, sixteen);
+    }
+    return result;
+}
+}  // namespace
+
+__attribute__((target("ssse3"))) void gatherRowSse(const unsigned char* row, const GatherTable& table,
+                                                   const int* offsets, unsigned char* out, int count) {
+    const int blocks = std::min(table.blocks(), count / 16);
+    const int* base = table.bases();
+    const unsigned char* windows = table.windowCounts();
+    const unsigned char* index = table.indices();
+    for (int b = 0; b < blocks; ++b) {
+        if (windows[b])
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 16 * b),
+                             gather16Sse(row + base[b], windows[b], index + 16 * b));
+        else
+            gatherRowScalar(row, offsets + 16 * b, out + 16 * b, 16);
+    }
+    gatherRowScalar(row, offsets + 16 * blocks, out + 16 * blocks, count - 16 * blocks);
+}
 #endif
 
 namespace {
-// Rows of the bilinear resize: each row's two source rows are first interpolated across,
-// truncated to 8 bits, into two row buffers, then the buffers are blended down.
-template <int D>
-void bilinearRows(const Image& source, Image& target, const BaseRect<int>& targetRect, int origin, int step,
-                  const std::vector<int>& left, const std::vector<int>& right, const std::vector<int>& fraction) {
-    const int H = source.height();
-    const int columns = targetRect.width();
-    std::vector<int> top(columns * D), bottom(columns * D);
+void gatherRow(const unsigned char* row, const GatherTable& table, const std::vector<int>& offsets,
+               unsigned char* out) {
+    const int count = static_cast<int>(offsets.size());
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    gatherRowNeon(row, table, offsets.data(), out, count);
+#else
 #if defined(LQ_HAVE_SSSE3)
-    MonoBlocks blocks;
-    if (D == 1 && haveSsse3ForResize()) blocks = monoBlocks(left, right, fraction, source.width());
+    if (table.blocks()) return gatherRowSse(row, table, offsets.data(), out, count);
 #endif
-    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
-        const int py = origin + y * step;
-        const int iy = std::min(py >> 8, H - 1);
-        const int fy = py & 255;
-        const unsigned char* upper = source.row(iy);
-        const unsigned char* lower = source.row(std::min(iy + 1, H - 1));
-        unsigned char* out = target.pixel(targetRect.left, y);
-        int start = 0;
-#if defined(LQ_HAVE_SSSE3)
-        if (D == 1 && blocks.count) start = bilinearMonoRowSse(upper, lower, blocks, fy, out);
+    gatherRowScalar(row, offsets.data(), out, count);
 #endif
-        for (int i = start; i < columns; ++i) {
-            const int fx = fraction[i], l = left[i], r = right[i];
-            for (int c = 0; c < D; ++c) {
-                top[i * D + c] = ((256 - fx) * upper[l + c] + fx * upper[r + c]) >> 8;
-                bottom[i * D + c] = ((256 - fx) * lower[l + c] + fx * lower[r + c]) >> 8;
-            }
+}
+
+void evenBytesRow(const unsigned char* in, unsigned char* out, int width) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    evenBytesRowNeon(in, out, width);
+#elif defined(LQ_HAVE_SSSE3)
+    if (cpuHasAvx2()) return evenBytesRowAvx2(in, out, width);
+    evenBytesRowSse(in, out, width);
+#else
+    evenBytesRowScalar(in, out, width);
+#endif
+}
+}  // namespace
+
+// ---- interpolation across a row and blends of two rows --------------------------------------
+
+void BilinearColumns::resize(int count) {
+    first.resize(count);
+    second.resize(count);
+    w0.resize(count);
+    w1.resize(count);
+}
+
+void BilinearColumns::buildTable(int rowBytes) {
+    const int blocks = count() / 8;
+    std::vector<int> offsets(16 * static_cast<size_t>(blocks));
+    for (int b = 0; b < blocks; ++b)
+        for (int j = 0; j < 8; ++j) {
+            offsets[16 * b + j] = first[8 * b + j];
+            offsets[16 * b + 8 + j] = second[8 * b + j];
         }
-        for (int i = start * D; i < columns * D; ++i)
-            out[i] = static_cast<unsigned char>(((256 - fy) * top[i] + fy * bottom[i]) >> 8);
+    table.build(offsets.data(), blocks, rowBytes);
+}
+
+namespace {
+void acrossRange(const unsigned char* row, const BilinearColumns& columns, unsigned short* out, int begin, int end) {
+    const int* first = columns.first.data();
+    const int* second = columns.second.data();
+    const unsigned short* w0 = columns.w0.data();
+    const unsigned short* w1 = columns.w1.data();
+    for (int i = begin; i < end; ++i) out[i] = static_cast<unsigned short>(row[first[i]] * w0[i] + row[second[i]] * w1[i]);
+}
+}  // namespace
+
+void bilinearAcrossScalar(const unsigned char* row, const BilinearColumns& columns, unsigned short* out) {
+    acrossRange(row, columns, out, 0, columns.count());
+}
+
+#if defined(LQ_HAVE_NEON)
+void bilinearAcrossNeon(const unsigned char* row, const BilinearColumns& columns, unsigned short* out) {
+    const GatherTable& table = columns.table;
+    const int blocks = std::min(table.blocks(), columns.count() / 8);
+    const int* base = table.bases();
+    const unsigned char* windows = table.windowCounts();
+    const unsigned char* index = table.indices();
+    const unsigned short* weights0 = columns.w0.data();
+    const unsigned short* weights1 = columns.w1.data();
+    for (int b = 0; b < blocks; ++b) {
+        if (!windows[b]) {
+            acrossRange(row, columns, out, 8 * b, 8 * b + 8);
+            continue;
+        }
+        const uint8x16_t bytes = gather16Neon(row + base[b], windows[b], index + 16 * b);
+        const uint16x8_t w0 = vld1q_u16(weights0 + 8 * b), w1 = vld1q_u16(weights1 + 8 * b);
+        const uint16x8_t sum = vmlaq_u16(vmulq_u16(vmovl_u8(vget_low_u8(bytes)), w0), vmovl_u8(vget_high_u8(bytes)), w1);
+        vst1q_u16(out + 8 * b, sum);
     }
+    acrossRange(row, columns, out, 8 * blocks, columns.count());
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+__attribute__((target("ssse3"))) void bilinearAcrossSse(const unsigned char* row, const BilinearColumns& columns,
+                                                        unsigned short* out) {
+    const GatherTable& table = columns.table;
+    const int blocks = std::min(table.blocks(), columns.count() / 8);
+    const int* base = table.bases();
+    const unsigned char* windows = table.windowCounts();
+    const unsigned char* index = table.indices();
+    const unsigned short* weights0 = columns.w0.data();
+    const unsigned short* weights1 = columns.w1.data();
+    const __m128i zero = _mm_setzero_si128();
+    for (int b = 0; b < blocks; ++b) {
+        if (!windows[b]) {
+            acrossRange(row, columns, out, 8 * b, 8 * b + 8);
+            continue;
+        }
+        const __m128i bytes = gather16Sse(row + base[b], windows[b], index + 16 * b);
+        const __m128i w0 = _mm_loadu_si128(reinterpret_cast<const __m128i*>(weights0 + 8 * b));
+        const __m128i w1 = _mm_loadu_si128(reinterpret_cast<const __m128i*>(weights1 + 8 * b));
+        const __m128i sum = _mm_add_epi16(_mm_mullo_epi16(_mm_unpacklo_epi8(bytes, zero), w0),
+                                          _mm_mullo_epi16(_mm_unpackhi_epi8(bytes, zero), w1));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 8 * b), sum);
+    }
+    acrossRange(row, columns, out, 8 * blocks, columns.count());
+}
+#endif
+
+void blendRows4Scalar(const unsigned short* t, const unsigned short* u, int alpha, unsigned char* out, int count) {
+    for (int i = 0; i < count; ++i) out[i] = static_cast<unsigned char>(((u[i] - t[i]) * alpha + t[i] * 16 + 128) >> 8);
+}
+
+void blendRows8Scalar(const unsigned short* t, const unsigned short* u, int fraction, unsigned char* out, int count) {
+    for (int i = 0; i < count; ++i)
+        out[i] = static_cast<unsigned char>(((256 - fraction) * (t[i] >> 8) + fraction * (u[i] >> 8)) >> 8);
+}
+
+#if defined(LQ_HAVE_NEON)
+// Both sums stay below 65536: 16 x 4080 + 128 and 256 x 255.
+void blendRows4Neon(const unsigned short* t, const unsigned short* u, int alpha, unsigned char* out, int count) {
+    const uint16x8_t wt = vdupq_n_u16(static_cast<uint16_t>(16 - alpha));
+    const uint16x8_t wu = vdupq_n_u16(static_cast<uint16_t>(alpha));
+    const uint16x8_t half = vdupq_n_u16(128);
+    int i = 0;
+    for (; i + 8 <= count; i += 8) {
+        const uint16x8_t sum = vmlaq_u16(vmlaq_u16(half, vld1q_u16(t + i), wt), vld1q_u16(u + i), wu);
+        vst1_u8(out + i, vshrn_n_u16(sum, 8));
+    }
+    blendRows4Scalar(t + i, u + i, alpha, out + i, count - i);
+}
+
+void blendRows8Neon(const unsigned short* t, const unsigned short* u, int fraction, unsigned char* out, int count) {
+    const uint16x8_t wt = vdupq_n_u16(static_cast<uint16_t>(256 - fraction));
+    const uint16x8_t wu = vdupq_n_u16(static_cast<uint16_t>(fraction));
+    int i = 0;
+    for (; i + 8 <= count; i += 8) {
+        const uint16x8_t top = vshrq_n_u16(vld1q_u16(t + i), 8), bottom = vshrq_n_u16(vld1q_u16(u + i), 8);
+        vst1_u8(out + i, vshrn_n_u16(vmlaq_u16(vmulq_u16(top, wt), bottom, wu), 8));
+    }
+    blendRows8Scalar(t + i, u + i, fraction, out + i, count - i);
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+// SSE2, which every x86-64 processor has; the same bounds as NEON's
+void blendRows4Sse(const unsigned short* t, const unsigned short* u, int alpha, unsigned char* out, int count) {
+    const __m128i wt = _mm_set1_epi16(static_cast<short>(16 - alpha)), wu = _mm_set1_epi16(static_cast<short>(alpha));
+    const __m128i half = _mm_set1_epi16(128);
+    const auto blend = [&](int i) {
+        const __m128i top = _mm_loadu_si128(reinterpret_cast<const __m128i*>(t + i));
+        const __m128i bottom = _mm_loadu_si128(reinterpret_cast<const __m128i*>(u + i));
+        const __m128i sum = _mm_add_epi16(_mm_mullo_epi16(top, wt), _mm_mullo_epi16(bottom, wu));
+        return _mm_srli_epi16(_mm_add_epi16(sum, half), 8);
+    };
+    int i = 0;
+    for (; i + 16 <= count; i += 16)
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(blend(i), blend(i + 8)));
+    blendRows4Scalar(t + i, u + i, alpha, out + i, count - i);
+}
+
+void blendRows8Sse(const unsigned short* t, const unsigned short* u, int fraction, unsigned char* out, int count) {
+    const __m128i wt = _mm_set1_epi16(static_cast<short>(256 - fraction));
+    const __m128i wu = _mm_set1_epi16(static_cast<short>(fraction));
+    const auto blend = [&](int i) {
+        const __m128i top = _mm_srli_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(t + i)), 8);
+        const __m128i bottom = _mm_srli_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(u + i)), 8);
+        return _mm_srli_epi16(_mm_add_epi16(_mm_mullo_epi16(top, wt), _mm_mullo_epi16(bottom, wu)), 8);
+    };
+    int i = 0;
+    for (; i + 16 <= count; i += 16)
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out + i), _mm_packus_epi16(blend(i), blend(i + 8)));
+    blendRows8Scalar(t + i, u + i, fraction, out + i, count - i);
+}
+#endif
+
+namespace {
+void bilinearAcross(const unsigned char* row, const BilinearColumns& columns, unsigned short* out) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    bilinearAcrossNeon(row, columns, out);
+#else
+#if defined(LQ_HAVE_SSSE3)
+    if (cpuHasSsse3()) return bilinearAcrossSse(row, columns, out);
+#endif
+    bilinearAcrossScalar(row, columns, out);
+#endif
+}
+
+void blendRows4(const unsigned short* t, const unsigned short* u, int alpha, unsigned char* out, int count) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    blendRows4Neon(t, u, alpha, out, count);
+#elif defined(LQ_HAVE_SSSE3)
+    blendRows4Sse(t, u, alpha, out, count);
+#else
+    blendRows4Scalar(t, u, alpha, out, count);
+#endif
+}
+
+void blendRows8(const unsigned short* t, const unsigned short* u, int fraction, unsigned char* out, int count) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    blendRows8Neon(t, u, fraction, out, count);
+#elif defined(LQ_HAVE_SSSE3)
+    blendRows8Sse(t, u, fraction, out, count);
+#else
+    blendRows8Scalar(t, u, fraction, out, count);
+#endif
+}
+
+// Two source rows interpolated across, kept while consecutive target rows need them.
+class AcrossRows {
+public:
+    AcrossRows(const unsigned char* data, size_t stride, const BilinearColumns& columns)
+        : data_(data), stride_(stride), columns_(columns) {
+        for (auto& buffer : buffers_) buffer.resize(columns.count());
+    }
+    // row index, keeping the other row wanted at the same time
+    const unsigned short* get(int index, int other) {
+        for (int s = 0; s < 2; ++s)
+            if (rows_[s] == index) return buffers_[s].data();
+        const int s = rows_[0] == other ? 1 : 0;
+        bilinearAcross(data_ + index * stride_, columns_, buffers_[s].data());
+        rows_[s] = index;
+        return buffers_[s].data();
+    }
+
+private:
+    const unsigned char* data_;
+    size_t stride_;
+    const BilinearColumns& columns_;
+    std::vector<unsigned short> buffers_[2];
+    int rows_[2] = {-1, -1};
+};
+}  // namespace
+
+// ---- bilinear and nearest ------------------------------------------------------------------
+
+namespace {
+// Depth through the masked mean of the four neighbours. On the last column or row the
+// missing neighbours have no weight; a 2 x 2 copy with the edge repeated keeps the reads
+// inside the image and gives the same value.
+unsigned short depthSample(const Image& source, int px, int py) {
+    const int ix = std::min(px >> 8, source.width() - 1), iy = std::min(py >> 8, source.height() - 1);
+    if (ix + 1 < source.width() && iy + 1 < source.height())
+        return static_cast<unsigned short>(source.fractionalPixel256(px, py));
+    const int nx = std::min(ix + 1, source.width() - 1), ny = std::min(iy + 1, source.height() - 1);
+    unsigned short block[4] = {source.pixel<unsigned short>(ix, iy)[0], source.pixel<unsigned short>(nx, iy)[0],
+                               source.pixel<unsigned short>(ix, ny)[0], source.pixel<unsigned short>(nx, ny)[0]};
+    Image local;
+    local.createRef(reinterpret_cast<unsigned char*>(block), BaseSize<int>(2, 2), COLOR_MODE_DEPTH);
+    return static_cast<unsigned short>(local.fractionalPixel256(px & 255, py & 255));
 }
 }  // namespace
 
 void resizeImageBilinear(const Image& source, Image& target, float scale, BaseRect<int> targetRect) {
+    if (&source == &target) {
+        const Image copy(source);
+        return resizeImageBilinear(copy, target, scale, targetRect);
+    }
     const ColorMode mode = source.colorMode();
     LQ_ASSERT_MSG(mode == COLOR_MODE_MONO || mode == COLOR_MODE_DEPTH || isColor(mode),
                   "color mode is not supported: " << mode);
@@ -377,7 +845,7 @@ void resizeImageBilinear(const Image& source, Image& target, float scale, BaseRe
     target.create(BaseSize<int>(static_cast<int>(W * scale * stable), static_cast<int>(H * scale * stable)), mode);
     LQ_ASSERT_CONTAINS(target.rect(), targetRect);
     targetRect = wholeIfEmpty(targetRect, target);
-    if (targetRect.area() <= 0) return;
+    if (isEmpty(targetRect)) return;
     const int tw = target.width(), th = target.height();
     int origin, step;
     if (scale >= 1) {
@@ -389,61 +857,47 @@ void resizeImageBilinear(const Image& source, Image& target, float scale, BaseRe
         origin = static_cast<int>(128 / scale * stable) - 128;
         step = static_cast<int>(256 / scale * stable);
     }
-    const int depth = source.depth();
     if (mode == COLOR_MODE_DEPTH) {
         for (int y = targetRect.top; y < targetRect.bottom; ++y) {
             unsigned short* out = target.row<unsigned short>(y);
-            const int py = origin + y * step;
-            for (int x = targetRect.left; x < targetRect.right; ++x) {
-                const int px = origin + x * step;
-                out[x] = static_cast<unsigned short>(source.fractionalPixel(px / 256.0f, py / 256.0f));
-            }
+            for (int x = targetRect.left; x < targetRect.right; ++x)
+                out[x] = depthSample(source, origin + x * step, origin + y * step);
         }
         return;
     }
-    // column table: the left neighbour's byte offset, the right one's and the fraction
-    const int columns = targetRect.width();
-    std::vector<int> left(columns), right(columns), fraction(columns);
-    for (int i = 0; i < columns; ++i) {
+    // Per target byte its two neighbours and weights. Positions never pass the last pixel;
+    // where one lands on it its right neighbour has weight 0 and is read as itself.
+    const int depth = source.depth();
+    const int count = targetRect.width() * depth;
+    BilinearColumns columns;
+    columns.resize(count);
+    for (int i = 0; i < targetRect.width(); ++i) {
         const int px = origin + (targetRect.left + i) * step;
-        const int ix = std::min(px >> 8, W - 1);
-        left[i] = ix * depth;
-        right[i] = std::min(ix + 1, W - 1) * depth;
-        fraction[i] = px & 255;
+        const int ix = std::min(px >> 8, W - 1), nx = std::min(ix + 1, W - 1);
+        const int fx = px & 255;
+        for (int c = 0; c < depth; ++c) {
+            columns.first[i * depth + c] = ix * depth + c;
+            columns.second[i * depth + c] = nx * depth + c;
+            columns.w0[i * depth + c] = static_cast<unsigned short>(256 - fx);
+            columns.w1[i * depth + c] = static_cast<unsigned short>(fx);
+        }
     }
-    switch (depth) {
-        case 1: bilinearRows<1>(source, target, targetRect, origin, step, left, right, fraction); break;
-        case 3: bilinearRows<3>(source, target, targetRect, origin, step, left, right, fraction); break;
-        case 4: bilinearRows<4>(source, target, targetRect, origin, step, left, right, fraction); break;
-        default: bilinearRows<2>(source, target, targetRect, origin, step, left, right, fraction); break;
-    }
-}
-
-void gatherRowScalar(const unsigned char* in, const int* columns, unsigned char* out, int width) {
-    int x = 0;
-    for (; x + 4 <= width; x += 4) {
-        const unsigned char a = in[columns[x]], b = in[columns[x + 1]], c = in[columns[x + 2]], d = in[columns[x + 3]];
-        out[x] = a, out[x + 1] = b, out[x + 2] = c, out[x + 3] = d;
-    }
-    for (; x < width; ++x) out[x] = in[columns[x]];
-}
-
-namespace {
-template <int N>
-void gatherPixels(const Image& source, Image& target, const BaseRect<int>& rect, const std::vector<int>& columns,
-                  const std::vector<int>& rows) {
-    struct Pixel {
-        unsigned char bytes[N];
-    };
-    for (int y = rect.top; y < rect.bottom; ++y) {
-        const Pixel* in = reinterpret_cast<const Pixel*>(source.row(rows[y - rect.top]));
-        Pixel* out = reinterpret_cast<Pixel*>(target.pixel(rect.left, y));
-        for (int i = 0; i < rect.width(); ++i) out[i] = in[columns[i]];
+    if (vectorGather()) columns.buildTable(W * depth);
+    AcrossRows rows(source.data(), source.stripLength(), columns);
+    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
+        const int py = origin + y * step;
+        const int iy = std::min(py >> 8, H - 1), ny = std::min(iy + 1, H - 1);
+        const unsigned short* upper = rows.get(iy, ny);
+        const unsigned short* lower = rows.get(ny, iy);
+        blendRows8(upper, lower, py & 255, target.pixel(targetRect.left, y), count);
     }
 }
-}  // namespace
 
 void resizeImageNn(const Image& source, Image& target, float scale, BaseRect<int> targetRect) {
+    if (&source == &target) {
+        const Image copy(source);
+        return resizeImageNn(copy, target, scale, targetRect);
+    }
     LQ_ASSERT_CREATED(source);
     const int depth = source.depth();
     LQ_ASSERT_MSG(depth >= 1 && depth <= 4, "color mode is not supported: " << source.colorMode());
@@ -453,37 +907,25 @@ void resizeImageNn(const Image& source, Image& target, float scale, BaseRect<int
                   source.colorMode());
     LQ_ASSERT_CONTAINS(target.rect(), targetRect);
     targetRect = wholeIfEmpty(targetRect, target);
-    if (targetRect.area() <= 0) return;
-    // tables for the rectangle only; a position never leaves the source
-    std::vector<int> columns(targetRect.width()), rows(targetRect.height());
-    for (int i = 0; i < targetRect.width(); ++i)
-        columns[i] = std::min(static_cast<int>((targetRect.left + i) / scale * stable), W - 1);
-    for (int i = 0; i < targetRect.height(); ++i)
-        rows[i] = std::min(static_cast<int>((targetRect.top + i) / scale * stable), H - 1);
-    switch (depth) {
-        case 1: {
-            // every second column from the first one: a plain stride, no table
-            bool everySecond = true;
-            for (int i = 1; i < targetRect.width() && everySecond; ++i) everySecond = columns[i] == columns[0] + 2 * i;
-            for (int y = targetRect.top; y < targetRect.bottom; ++y) {
-                const unsigned char* in = source.row(rows[y - targetRect.top]);
-                unsigned char* out = target.pixel(targetRect.left, y);
-#if defined(LQ_HAVE_SSSE3)
-                if (everySecond) {
-                    if (haveAvx2Cpu())
-                        evenBytesRowAvx2(in + columns[0], out, targetRect.width());
-                    else
-                        evenBytesRowSse(in + columns[0], out, targetRect.width());
-                    continue;
-                }
-#endif
-                gatherRowScalar(in, columns.data(), out, targetRect.width());
-            }
-            break;
-        }
-        case 2: gatherPixels<2>(source, target, targetRect, columns, rows); break;
-        case 3: gatherPixels<3>(source, target, targetRect, columns, rows); break;
-        default: gatherPixels<4>(source, target, targetRect, columns, rows); break;
+    if (isEmpty(targetRect)) return;
+    // byte offsets of the rectangle's columns; a position never leaves the source
+    std::vector<int> offsets(static_cast<size_t>(targetRect.width()) * depth);
+    for (int i = 0; i < targetRect.width(); ++i) {
+        const int column = std::min(static_cast<int>((targetRect.left + i) / scale * stable), W - 1);
+        for (int c = 0; c < depth; ++c) offsets[i * depth + c] = column * depth + c;
+    }
+    // every second byte, the common halving of mono, has a loop of its own
+    bool even = depth == 1;
+    for (size_t i = 0; i < offsets.size() && even; ++i) even = offsets[i] == offsets[0] + 2 * static_cast<int>(i);
+    GatherTable table;
+    if (!even && vectorGather()) table.build(offsets.data(), static_cast<int>(offsets.size() / 16), W * depth);
+    for (int y = targetRect.top; y < targetRect.bottom; ++y) {
+        const unsigned char* in = source.row(std::min(static_cast<int>(y / scale * stable), H - 1));
+        unsigned char* out = target.pixel(targetRect.left, y);
+        if (even)
+            evenBytesRow(in + offsets[0], out, targetRect.width());
+        else
+            gatherRow(in, table, offsets, out);
     }
 }
 
@@ -498,15 +940,17 @@ void resizeImageAccurate(const Image& source, Image& target, float scale, BaseRe
 
 void EstimateAlphaIndexBase(size_t srcSize, size_t dstSize, int* indices, int* alphas, size_t channels) {
     const float ratio = static_cast<float>(srcSize) / static_cast<float>(dstSize);
+    const int last = static_cast<int>(srcSize) - 2;
     for (size_t i = 0; i < dstSize; ++i) {
         const double position = (i + 0.5) * ratio - 0.5;
         int index = static_cast<int>(std::floor(position));
         int alpha;
-        if (index < 0) {
+        if (last < 0 || index < 0) {
+            // a single pixel has nothing to interpolate with
             index = 0;
             alpha = 0;
-        } else if (index > static_cast<int>(srcSize) - 2) {
-            index = static_cast<int>(srcSize) - 2;
+        } else if (index > last) {
+            index = last;
             alpha = 16;
         } else {
             alpha = static_cast<int>((position - index) * 16 + 0.5);
@@ -519,24 +963,39 @@ void EstimateAlphaIndexBase(size_t srcSize, size_t dstSize, int* indices, int* a
 }
 
 namespace {
-// the kernel's scratch: tables and two rows of horizontally interpolated values
-struct BilinearScratch {
-    size_t rowLength = 0, dstHeight = 0;
-    std::vector<int> columnIndex, columnAlpha, rowIndex, rowAlpha;
-    std::vector<int> rows[2];
-};
-BilinearScratch& scratch() {
-    static BilinearScratch block;
-    return block;
-}
+// The kernel's scratch: tables and the two rows interpolated across. Replaced when a
+// call's sizes differ from the last call's.
+struct BilinearBlock {
+    size_t srcWidth = 0, srcHeight = 0, dstWidth = 0, dstHeight = 0, channels = 0;
+    BilinearColumns columns;
+    std::vector<int> rowIndex, rowAlpha;
+    std::vector<unsigned short> rows[2];
 
-void interpolateRow(const unsigned char* row, const BilinearScratch& s, size_t channels, int* out) {
-    const size_t length = s.columnIndex.size();
-    for (size_t i = 0; i < length; ++i) {
-        const int at = s.columnIndex[i];
-        const int here = row[at], next = row[at + channels];
-        out[i] = (next - here) * s.columnAlpha[i] + here * 16;
+    void prepare(size_t sw, size_t sh, size_t dw, size_t dh, size_t ch) {
+        if (sw == srcWidth && sh == srcHeight && dw == dstWidth && dh == dstHeight && ch == channels) return;
+        srcWidth = sw, srcHeight = sh, dstWidth = dw, dstHeight = dh, channels = ch;
+        const int count = static_cast<int>(dw * ch);
+        std::vector<int> alphas(count);
+        columns.resize(count);
+        EstimateAlphaIndexBase(sw, dw, columns.first.data(), alphas.data(), ch);
+        for (int i = 0; i < count; ++i) {
+            // a source one pixel wide has no second neighbour: the first stands in, at weight 0
+            columns.second[i] = sw > 1 ? columns.first[i] + static_cast<int>(ch) : columns.first[i];
+            columns.w0[i] = static_cast<unsigned short>(16 - alphas[i]);
+            columns.w1[i] = static_cast<unsigned short>(alphas[i]);
+        }
+        columns.buildTable(static_cast<int>(sw * ch));
+        rowIndex.resize(dh);
+        rowAlpha.resize(dh);
+        EstimateAlphaIndexBase(sh, dh, rowIndex.data(), rowAlpha.data(), 1);
+        rows[0].resize(count);
+        rows[1].resize(count);
     }
+};
+
+BilinearBlock& bilinearBlock() {
+    static BilinearBlock block;
+    return block;
 }
 }  // namespace
 
@@ -544,45 +1003,38 @@ void ResizeBilinearBase(const unsigned char* source, size_t srcWidth, size_t src
                         unsigned char* target, size_t dstWidth, size_t dstHeight, size_t dstStride,
                         size_t channelCount) {
     LQ_ASSERT_MSG(channelCount >= 1 && channelCount <= 4, "Unsupported channel count " << channelCount);
-    BilinearScratch& s = scratch();
-    const size_t rowLength = dstWidth * channelCount;
-    if (rowLength != s.rowLength || dstHeight != s.dstHeight) {
-        s.rowLength = rowLength;
-        s.dstHeight = dstHeight;
-        s.columnIndex.resize(rowLength);
-        s.columnAlpha.resize(rowLength);
-        s.rowIndex.resize(dstHeight);
-        s.rowAlpha.resize(dstHeight);
-        s.rows[0].resize(rowLength);
-        s.rows[1].resize(rowLength);
+    if (dstWidth == 0 || dstHeight == 0) return;
+    LQ_ASSERT_MSG(srcWidth > 0 && srcHeight > 0, "empty source " << srcWidth << "x" << srcHeight);
+    if (srcWidth == 2 * dstWidth && srcHeight == 2 * dstHeight) {
+        // At exactly half the size every alpha is 8 and no index is clamped: t = 8 (a + b),
+        // u = 8 (c + d), and (8 t + 8 u + 128) >> 8 = (a + b + c + d + 2) >> 2.
+        const int channels = static_cast<int>(channelCount), width = static_cast<int>(dstWidth);
+        for (size_t y = 0; y < dstHeight; ++y)
+            halveRoundedRow(source + 2 * y * srcStride, source + (2 * y + 1) * srcStride, target + y * dstStride,
+                            width, channels);
+        return;
     }
-    // every target pixel reads two neighbours in each direction
-    LQ_ASSERT_MSG(srcWidth >= 2 && srcHeight >= 2, "source too small: " << srcWidth << "x" << srcHeight);
-    EstimateAlphaIndexBase(srcWidth, dstWidth, s.columnIndex.data(), s.columnAlpha.data(), channelCount);
-    EstimateAlphaIndexBase(srcHeight, dstHeight, s.rowIndex.data(), s.rowAlpha.data(), 1);
-    int* first = s.rows[0].data();
-    int* second = s.rows[1].data();
-    int previous = -2;
+    BilinearBlock& block = bilinearBlock();
+    block.prepare(srcWidth, srcHeight, dstWidth, dstHeight, channelCount);
+    const int count = static_cast<int>(dstWidth * channelCount);
+    const int lastRow = static_cast<int>(srcHeight) - 1;
+    unsigned short* t = block.rows[0].data();
+    unsigned short* u = block.rows[1].data();
+    int previous = -2;  // no row yet
     for (size_t y = 0; y < dstHeight; ++y) {
-        const int index = s.rowIndex[y];
-        if (index == previous + 1) {
-            std::swap(first, second);
-            interpolateRow(source + (index + 1) * srcStride, s, channelCount, second);
-        } else if (index != previous) {
-            interpolateRow(source + index * srcStride, s, channelCount, first);
-            interpolateRow(source + (index + 1) * srcStride, s, channelCount, second);
+        const int s = block.rowIndex[y];
+        const unsigned char* upper = source + s * srcStride;
+        const unsigned char* lower = source + std::min(s + 1, lastRow) * srcStride;
+        if (s == previous + 1) {
+            // moved down by one row: the old lower row is the new upper one
+            std::swap(t, u);
+            bilinearAcross(lower, block.columns, u);
+        } else if (s != previous) {
+            bilinearAcross(upper, block.columns, t);
+            bilinearAcross(lower, block.columns, u);
         }
-        previous = index;
-        const int alpha = s.rowAlpha[y];
-        unsigned char* out = target + y * dstStride;
-        if (alpha == 0) {
-            for (size_t i = 0; i < rowLength; ++i) out[i] = static_cast<unsigned char>((first[i] * 16 + 128) >> 8);
-        } else if (alpha == 16) {
-            for (size_t i = 0; i < rowLength; ++i) out[i] = static_cast<unsigned char>((second[i] * 16 + 128) >> 8);
-        } else {
-            for (size_t i = 0; i < rowLength; ++i)
-                out[i] = static_cast<unsigned char>(((second[i] - first[i]) * alpha + first[i] * 16 + 128) >> 8);
-        }
+        previous = s;
+        blendRows4(t, u, block.rowAlpha[y], target + y * dstStride, count);
     }
 }
 

@@ -241,6 +241,30 @@ void hogRowScalar(const unsigned char* up, const unsigned char* mid, const unsig
 // after; the last position takes the exact channel count.
 #if defined(LQ_HAVE_NEON)
 namespace {
+// g / 4 truncated toward zero
+inline int16x8_t divide4Neon(int16x8_t g) {
+    const int16x8_t bias = vreinterpretq_s16_u16(vshrq_n_u16(vreinterpretq_u16_s16(vshrq_n_s16(g, 15)), 14));
+    return vshrq_n_s16(vaddq_s16(g, bias), 2);
+}
+
+// the table entries of columns i .. i + 7, which need i + 8 inside the rows
+inline void hogEntries8Neon(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int i,
+                            int* entries) {
+    const auto load = [](const unsigned char* p) { return vreinterpretq_s16_u16(vmovl_u8(vld1_u8(p))); };
+    const int16x8_t u0 = load(up + i - 1), u1 = load(up + i), u2 = load(up + i + 1);
+    const int16x8_t m0 = load(mid + i - 1), m2 = load(mid + i + 1);
+    const int16x8_t d0 = load(down + i - 1), d1 = load(down + i), d2 = load(down + i + 1);
+    const int16x8_t dm = vsubq_s16(m2, m0);  // doubled by an add: a left shift of a negative lane is undefined
+    const int16x8_t gx = vaddq_s16(vaddq_s16(vsubq_s16(u2, u0), vsubq_s16(d2, d0)), vaddq_s16(dm, dm));
+    const int16x8_t gy = vsubq_s16(vaddq_s16(vaddq_s16(d0, d2), vshlq_n_s16(d1, 1)),
+                                   vaddq_s16(vaddq_s16(u0, u2), vshlq_n_s16(u1, 1)));
+    const int16x8_t a = divide4Neon(gx), b = divide4Neon(gy);
+    // (a + 256) * 512 + (b + 256), by a multiply-add (a shift of a negative a is undefined)
+    const int32x4_t offset = vdupq_n_s32(256 * kSide + 256);
+    vst1q_s32(entries, vmlal_n_s16(vaddq_s32(vmovl_s16(vget_low_s16(b)), offset), vget_low_s16(a), kSide));
+    vst1q_s32(entries + 4, vmlal_n_s16(vaddq_s32(vmovl_s16(vget_high_s16(b)), offset), vget_high_s16(a), kSide));
+}
+
 template <int Bins>
 void hogRowNeon(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int width,
                 const unsigned char* hog, const unsigned int* previous, unsigned int* current) {
@@ -255,15 +279,23 @@ void hogRowNeon(const unsigned char* up, const unsigned char* mid, const unsigne
     }
     const unsigned int* above = previous + 2 * channels;
     unsigned int* out = current + 2 * channels;
-    for (int i = 1; i <= width - 2; ++i, above += channels, out += channels) {
-        const int entry = hogEntry(up, mid, down, i);
+    const auto add = [&](int entry) {
         const uint32x4_t bin = vdupq_n_u32(hog[entry]), m = vdupq_n_u32(magnitudes[entry]);
         for (int v = 0; v < vectors; ++v) {
             const uint32x4_t hit = vorrq_u32(vceqq_u32(lane[v], bin), total[v]);
             accumulator[v] = vaddq_u32(accumulator[v], vandq_u32(hit, m));
             vst1q_u32(out + 4 * v, vaddq_u32(vld1q_u32(above + 4 * v), accumulator[v]));
         }
+        above += channels;
+        out += channels;
+    };
+    int i = 1;
+    int entries[8];
+    for (; i + 9 <= width; i += 8) {
+        hogEntries8Neon(up, mid, down, i, entries);
+        for (int e = 0; e < 8; ++e) add(entries[e]);
     }
+    for (; i <= width - 2; ++i) add(hogEntry(up, mid, down, i));
     unsigned int last[4 * vectors];
     for (int v = 0; v < vectors; ++v) vst1q_u32(last + 4 * v, accumulator[v]);
     for (int k = 0; k < channels; ++k) out[k] = above[k] + last[k];
@@ -273,6 +305,31 @@ void hogRowNeon(const unsigned char* up, const unsigned char* mid, const unsigne
 
 #if defined(LQ_HAVE_SSSE3)
 namespace {
+inline __m128i divide4Sse(__m128i g) {
+    return _mm_srai_epi16(_mm_add_epi16(g, _mm_srli_epi16(_mm_srai_epi16(g, 15), 14)), 2);
+}
+
+inline void hogEntries8Sse(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int i,
+                           int* entries) {
+    const __m128i zero = _mm_setzero_si128();
+    const auto load = [zero](const unsigned char* p) {
+        return _mm_unpacklo_epi8(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(p)), zero);
+    };
+    const __m128i u0 = load(up + i - 1), u1 = load(up + i), u2 = load(up + i + 1);
+    const __m128i m0 = load(mid + i - 1), m2 = load(mid + i + 1);
+    const __m128i d0 = load(down + i - 1), d1 = load(down + i), d2 = load(down + i + 1);
+    const __m128i dm = _mm_sub_epi16(m2, m0);
+    const __m128i gx = _mm_add_epi16(_mm_add_epi16(_mm_sub_epi16(u2, u0), _mm_sub_epi16(d2, d0)), _mm_add_epi16(dm, dm));
+    const __m128i gy = _mm_sub_epi16(_mm_add_epi16(_mm_add_epi16(d0, d2), _mm_add_epi16(d1, d1)),
+                                     _mm_add_epi16(_mm_add_epi16(u0, u2), _mm_add_epi16(u1, u1)));
+    const __m128i a = _mm_add_epi16(divide4Sse(gx), _mm_set1_epi16(256));
+    const __m128i b = _mm_add_epi16(divide4Sse(gy), _mm_set1_epi16(256));
+    // (a + 256) * 512 + (b + 256) from the interleaved pairs in one multiply-add
+    const __m128i weights = _mm_set1_epi32(1 << 16 | kSide);
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(entries), _mm_madd_epi16(_mm_unpacklo_epi16(a, b), weights));
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(entries + 4), _mm_madd_epi16(_mm_unpackhi_epi16(a, b), weights));
+}
+
 template <int Bins>
 void hogRowSse(const unsigned char* up, const unsigned char* mid, const unsigned char* down, int width,
                const unsigned char* hog, const unsigned int* previous, unsigned int* current) {
@@ -286,8 +343,7 @@ void hogRowSse(const unsigned char* up, const unsigned char* mid, const unsigned
     }
     const unsigned int* above = previous + 2 * channels;
     unsigned int* out = current + 2 * channels;
-    for (int i = 1; i <= width - 2; ++i, above += channels, out += channels) {
-        const int entry = hogEntry(up, mid, down, i);
+    const auto add = [&](int entry) {
         const __m128i bin = _mm_set1_epi32(hog[entry]), m = _mm_set1_epi32(magnitudes[entry]);
         for (int v = 0; v < vectors; ++v) {
             const __m128i hit = _mm_or_si128(_mm_cmpeq_epi32(lane[v], bin), total[v]);
@@ -296,7 +352,16 @@ void hogRowSse(const unsigned char* up, const unsigned char* mid, const unsigned
                 _mm_add_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(above + 4 * v)), accumulator[v]);
             _mm_storeu_si128(reinterpret_cast<__m128i*>(out + 4 * v), sum);
         }
+        above += channels;
+        out += channels;
+    };
+    int i = 1;
+    int entries[8];
+    for (; i + 9 <= width; i += 8) {
+        hogEntries8Sse(up, mid, down, i, entries);
+        for (int e = 0; e < 8; ++e) add(entries[e]);
     }
+    for (; i <= width - 2; ++i) add(hogEntry(up, mid, down, i));
     unsigned int last[4 * vectors];
     for (int v = 0; v < vectors; ++v) _mm_storeu_si128(reinterpret_cast<__m128i*>(last + 4 * v), accumulator[v]);
     for (int k = 0; k < channels; ++k) out[k] = above[k] + last[k];

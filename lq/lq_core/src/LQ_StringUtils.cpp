@@ -60,7 +60,9 @@ bool compareStringsNumeric(const std::string& a, const std::string& b) {
     return a < b;
 }
 
-void numericSort(std::vector<std::string>& list) { std::sort(list.begin(), list.end(), compareStringsNumeric); }
+void numericSort(std::vector<std::string>& list) {
+    std::sort(list.begin(), list.end(), compareStringsNumeric);
+}
 
 std::string toBits(unsigned int value) {
     const int bits = value < 256 ? 8 : 32;

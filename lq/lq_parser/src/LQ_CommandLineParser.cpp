@@ -14,11 +14,16 @@ bool warningsSuppressed = false;
 
 const char* typeWord(int type) {
     switch (type & 15) {
-        case ValueType::STRING: return "STRING";
-        case ValueType::INT: return "INT";
-        case ValueType::FLOAT: return "FLOAT";
-        case ValueType::BOOL: return "BOOL";
-        default: return "";
+        case ValueType::STRING:
+            return "STRING";
+        case ValueType::INT:
+            return "INT";
+        case ValueType::FLOAT:
+            return "FLOAT";
+        case ValueType::BOOL:
+            return "BOOL";
+        default:
+            return "";
     }
 }
 }  // namespace
@@ -105,8 +110,10 @@ void parseString(const std::string& text, std::vector<std::pair<std::string, std
             pairs.emplace_back(token.substr(1, 1), value);
         } else {
             const size_t equals = token.find('=');
-            const std::string key = token.substr(2, equals == std::string::npos ? std::string::npos : equals - 2);
-            pairs.emplace_back(key, equals == std::string::npos ? std::string() : getRawValue(token.substr(equals + 1)));
+            const std::string key =
+                token.substr(2, equals == std::string::npos ? std::string::npos : equals - 2);
+            pairs.emplace_back(
+                key, equals == std::string::npos ? std::string() : getRawValue(token.substr(equals + 1)));
         }
     }
 }
@@ -117,8 +124,9 @@ CommandLineParser::CommandLineParser(const std::string& usageHead, const std::st
     add("-i", "--import", "", false, 1, "[Parser] Load command line parameters from file");
 }
 
-void CommandLineParser::add(const std::string& shortKey, const std::string& longKey, const std::string& defaultValue,
-                            bool required, int type, const std::string& description) {
+void CommandLineParser::add(const std::string& shortKey, const std::string& longKey,
+                            const std::string& defaultValue, bool required, int type,
+                            const std::string& description) {
     SingleKeyInfo info;
     info.shortKey = shortKey;
     info.longKey = longKey;
@@ -168,7 +176,9 @@ void CommandLineParser::import(const std::string& fileName) {
     import(file);
 }
 
-void CommandLineParser::import(std::istream& stream) { parse(parseStream(stream)); }
+void CommandLineParser::import(std::istream& stream) {
+    parse(parseStream(stream));
+}
 
 bool CommandLineParser::findRecognizedKey(const std::vector<std::string>& args, size_t& position) {
     for (; position < args.size(); ++position) {
@@ -187,7 +197,8 @@ void CommandLineParser::insertArgument(unsigned int index) {
     if (required != requiredKeys_.end()) required->second = true;
 }
 
-bool CommandLineParser::readArguments(const std::vector<std::string>& args, size_t position, unsigned int index) {
+bool CommandLineParser::readArguments(const std::vector<std::string>& args, size_t position,
+                                      unsigned int index) {
     for (unsigned int k = 1; k <= keysInfo_[index].argumentsCount; ++k) {
         const std::string& token = args[position + k];
         if (keyIndex_.count(token)) return false;
@@ -344,10 +355,16 @@ void CommandLineParser::reset() {
     for (auto& entry : requiredKeys_) entry.second = false;
 }
 
-void CommandLineParser::suppressWarnings() { warningsSuppressed = true; }
+void CommandLineParser::suppressWarnings() {
+    warningsSuppressed = true;
+}
 
-bool CommandLineParser::checkShortKey(const std::string& key) { return key.size() == 2 && key[0] == '-'; }
+bool CommandLineParser::checkShortKey(const std::string& key) {
+    return key.size() == 2 && key[0] == '-';
+}
 
-bool CommandLineParser::checkLongKey(const std::string& key) { return key.size() >= 4 && key.compare(0, 2, "--") == 0; }
+bool CommandLineParser::checkLongKey(const std::string& key) {
+    return key.size() >= 4 && key.compare(0, 2, "--") == 0;
+}
 
 }  // namespace LQ

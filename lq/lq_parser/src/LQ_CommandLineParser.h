@@ -31,11 +31,12 @@ struct SingleKeyInfo {
 
 class CommandLineParser {
 public:
-    CommandLineParser(const std::string& usageHead = std::string(), const std::string& usageTail = std::string());
+    CommandLineParser(const std::string& usageHead = std::string(),
+                      const std::string& usageTail = std::string());
 
     // type: a ValueType value; 0 takes no argument
-    void add(const std::string& shortKey, const std::string& longKey, const std::string& defaultValue, bool required,
-             int type, const std::string& description);
+    void add(const std::string& shortKey, const std::string& longKey, const std::string& defaultValue,
+             bool required, int type, const std::string& description);
     void setDefaultValue(const std::string& longKey, const std::string& value);
 
     // Each parse keeps its fixed argument list and adds to the values of earlier ones.

@@ -97,11 +97,14 @@ void IniParser::getAllKeys(std::vector<std::string>& keys) const {
     keys.clear();
     for (const auto& section : sections_) {
         for (const auto& entry : section.second)
-            keys.push_back(section.first.empty() ? entry.first : section.first + sectionSeparator_ + entry.first);
+            keys.push_back(section.first.empty() ? entry.first
+                                                 : section.first + sectionSeparator_ + entry.first);
     }
 }
 
-void IniParser::reset() { sections_.clear(); }
+void IniParser::reset() {
+    sections_.clear();
+}
 
 void IniParser::splitFullKey(const std::string& fullKey, std::string& section, std::string& key) const {
     const size_t separator = fullKey.find(sectionSeparator_);
@@ -114,7 +117,9 @@ void IniParser::splitFullKey(const std::string& fullKey, std::string& section, s
     }
 }
 
-std::string cleanFromComments(const std::string& line, char commentChar) { return line.substr(0, line.find(commentChar)); }
+std::string cleanFromComments(const std::string& line, char commentChar) {
+    return line.substr(0, line.find(commentChar));
+}
 
 std::string trim(const std::string& line) {
     const size_t first = line.find_first_not_of(" \t");
@@ -129,9 +134,13 @@ bool getSectionName(const std::string& line, std::string& name) {
     return !name.empty() && name.find_first_of(" \t=[]") == std::string::npos;
 }
 
-bool isKeyCorrect(const std::string& key) { return key.size() > 1 && key.find_first_of(" \t-=[]") == std::string::npos; }
+bool isKeyCorrect(const std::string& key) {
+    return key.size() > 1 && key.find_first_of(" \t-=[]") == std::string::npos;
+}
 
-bool isValueCorrect(const std::string& value) { return value.find('=') == std::string::npos; }
+bool isValueCorrect(const std::string& value) {
+    return value.find('=') == std::string::npos;
+}
 
 bool splitKeyValue(const std::string& line, std::string& key, std::string& value) {
     const size_t equals = line.find('=');
@@ -143,12 +152,15 @@ bool splitKeyValue(const std::string& line, std::string& key, std::string& value
     value = trim(line.substr(equals + 1));
     if (!value.empty() && value[0] == '"') {
         value.erase(0, 1);
-        LQ_ASSERT_MSG(!value.empty() && value.back() == '"', "Closing quote is missing in the end of value: " << value);
+        LQ_ASSERT_MSG(!value.empty() && value.back() == '"',
+                      "Closing quote is missing in the end of value: " << value);
         value.pop_back();
     }
     return isKeyCorrect(key) && isValueCorrect(value);
 }
 
-void writeError(const std::string& text) { std::cerr << "[error] " << text << "\n"; }
+void writeError(const std::string& text) {
+    std::cerr << "[error] " << text << "\n";
+}
 
 }  // namespace LQ
