@@ -17,6 +17,9 @@ std::string toStr(int value, int width, char fill);
 
 namespace LQ {
 
+typedef unsigned char uchar;
+typedef signed char schar;
+
 enum LogLevel { LOG_LEVEL_DEBUG = 0, LOG_LEVEL_INFO = 1, LOG_LEVEL_WARNING = 2, LOG_LEVEL_FATAL = 4 };
 
 constexpr const char* LOG_TAG = "LumiqVision";

@@ -1,0 +1,245 @@
+#include "CascadedClassifier.h"
+
+#include <algorithm>
+#include <set>
+
+#include "LQ_Integral.h"
+#include "LQ_Utils.h"
+
+namespace {
+// One stable text per distinct name: hits keep a pointer to it and grouping compares
+// names by pointer, so every cascade of a ring must hand out the same one.
+const char* internName(const std::string& name) {
+    static std::set<std::string> names;
+    return names.insert(name).first->c_str();
+}
+}  // namespace
+
+CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& other) {
+    if (this == &other) return *this;
+    ClassifierProperties::operator=(other);
+    strongClassifiers = other.strongClassifiers;
+    hogImage_ = LQ::Image();
+    hogRoiComputed_ = other.hogRoiComputed_;
+    hogRoi_ = other.hogRoi_;
+    monoStride_ = other.monoStride_;
+    firstHogStage_ = other.firstHogStage_;
+    firstStageFlag_ = other.firstStageFlag_;
+    startStage_ = other.startStage_;
+    firstThreshold_ = other.firstThreshold_;
+    shiftTables_ = other.shiftTables_;
+    firstStage_ = other.firstStage_ ? &strongClassifiers.front() : nullptr;
+    firstTests_ = other.firstTests_;
+    sharedName_ = other.sharedName_;
+    hogComputations_ = 0;
+    return *this;
+}
+
+void CascadedClassifier::setName(const std::string& name) {
+    ClassifierProperties::setName(name);
+    sharedName_ = internName(name);
+}
+
+void CascadedClassifier::resetRunTimeState() {
+    hogRoiComputed_ = false;
+    hogRoi_ = LQ::BaseRect<int>();
+    firstStage_ = nullptr;
+    firstTests_.clear();
+    firstHogStage_ = 0x7fffffff;
+    firstStageFlag_ = false;
+    startStage_ = 0;
+    firstThreshold_ = INT_MIN;
+}
+
+void CascadedClassifier::rotate() {
+    resetRunTimeState();
+    for (StrongClassifier& stage : strongClassifiers) stage.rotate(monoSize);
+    ClassifierProperties::rotate();
+}
+
+void CascadedClassifier::flipVertically() {
+    resetRunTimeState();
+    for (StrongClassifier& stage : strongClassifiers) stage.flip(monoSize);
+    ClassifierProperties::flip();
+}
+
+void CascadedClassifier::calculateHogRoi() {
+    if (hogRoiComputed_) return;
+    hogRoiComputed_ = true;
+    hogRoi_ = LQ::BaseRect<int>();
+    firstHogStage_ = static_cast<int>(strongClassifiers.size());
+    for (size_t s = 0; s < strongClassifiers.size(); ++s) {
+        if (strongClassifiers[s].hogClassifiers().empty()) continue;
+        const LQ::BaseRect<int> roi = strongClassifiers[s].calculateHogRoi();
+        if (firstHogStage_ == static_cast<int>(strongClassifiers.size())) {
+            hogRoi_ = roi;
+            firstHogStage_ = static_cast<int>(s);
+        } else {
+            hogRoi_ = LQ::BaseRect<int>(std::min(hogRoi_.left, roi.left), std::min(hogRoi_.top, roi.top),
+                                        std::max(hogRoi_.right, roi.right), std::max(hogRoi_.bottom, roi.bottom));
+        }
+    }
+    const LQ::BaseRect<int> monoRect(0, 0, monoSize.width + 1, monoSize.height + 1);
+    LQ_ASSERT_MSG(monoRect.contains(hogRoi_), "Computed hogRoi " << hogRoi_ << " is out of monoSize + 1 " << monoRect);
+    for (StrongClassifier& stage : strongClassifiers) stage.moveHogRoi(hogRoi_);
+}
+
+void CascadedClassifier::activate(int rmctStride, int monoStride, int integralStride, float scale,
+                                  const LQ::BaseSize<int>& monoSize) {
+    calculateHogRoi();
+    monoStride_ = monoStride;
+    LQ_ASSERT_MSG(LQ::Rect(monoSize).contains(hogRoi_), "image Size " << monoSize << " to small for Hog " << hogRoi_);
+    for (StrongClassifier& stage : strongClassifiers) stage.activate(rmctStride, integralStride, scale);
+    if (!firstStage_) {
+        LQ_ASSERT_MSG(!strongClassifiers.empty(), "Activating empty cascade Classifier " << getName());
+        firstStage_ = &strongClassifiers.front();
+        const StrongClassifier& first = *firstStage_;
+        firstStageFlag_ = !first.rmctClassifiers().empty() && first.haarClassifiers().empty() &&
+                          first.hogClassifiers().empty();
+        startStage_ = firstStageFlag_ ? 1 : 0;
+        firstThreshold_ = first.getThreshold();
+    }
+    // the packed copy of the first test follows the present stride; same size, no allocation
+    if (firstStageFlag_) {
+        const std::vector<WeakClassifierRmct>& rmct = firstStage_->rmctClassifiers();
+        firstTests_.resize(rmct.size());
+        for (size_t k = 0; k < rmct.size(); ++k) firstTests_[k] = FirstTest{rmct[k].table, rmct[k].offset};
+    }
+}
+
+void CascadedClassifier::addMatches(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integral,
+                                    std::vector<AdaObject>& objects, const LQ::BaseRect<int>& roi, float scale,
+                                    int step) {
+    const int W = monoSize.width, H = monoSize.height;
+    // windows whose object lies in roi, clipped to the layer
+    LQ::BaseRect<int> windows(roi.left - objectRect_.left, roi.top - objectRect_.top,
+                              roi.right + W - objectRect_.right, roi.bottom + H - objectRect_.bottom);
+    windows = windows.intersect(mono.rect());
+    if (windows.area() == 0) windows = LQ::BaseRect<int>();
+    const int lastX = windows.right - W;
+    const int lastY = windows.bottom - H;
+    if (windows.left > lastX || windows.top > lastY) return;
+
+    const int m = std::max(std::max(lastX, lastY), 1);
+    const int k = scaleBucket(scale);
+    std::vector<int>& shift = shiftTables_[k];
+    // a table made at one scale serves the later scales of its bucket
+    if (static_cast<int>(shift.size()) < m + 1) {
+        shift.resize(m + 1);
+        for (int i = 0; i <= m; ++i) shift[i] = static_cast<int>(i * scale);
+    }
+    activate(static_cast<int>(rmct.stripLength()), static_cast<int>(mono.stripLength()),
+             static_cast<int>(integral.stripLength()), scale, monoSize);
+
+    const LQ::BaseRect<int> positions(windows.left, windows.top, lastX, lastY);
+    const StrongClassifier& first = strongClassifiers.front();
+    if (first.haarClassifiers().size() == 1 && first.rmctClassifiers().empty() && first.hogClassifiers().empty())
+        addMatchesDynamic(rmct, mono, integral, objects, positions, k, step);
+    else
+        addMatchesStatic(rmct, mono, integral, objects, positions, k, step);
+}
+
+void CascadedClassifier::addMatches(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integral,
+                                    std::vector<AdaObject>& objects, float scale, int step) {
+    addMatches(rmct, mono, integral, objects, rmct.rect(), scale, step);
+}
+
+void CascadedClassifier::appendObject(std::vector<AdaObject>& objects, int x, int y, int score) const {
+    objects.emplace_back(sharedName_, baseSize_, LQ::BasePoint<int>(objectCenter_.x + x, objectCenter_.y + y),
+                         (side_ & 1) ? SIDE_SCORE : -SIDE_SCORE, 1.0f, angle_, 1, score);
+}
+
+bool CascadedClassifier::passesFrom(int first, const unsigned char* r, const unsigned char* m,
+                                    const unsigned int* i, int& score) {
+    const int stages = static_cast<int>(strongClassifiers.size());
+    for (int s = first; s < stages; ++s) {
+        if (s == firstHogStage_) {
+            LQ::computeIntegralHog(m, monoStride_, hogImage_, hogRoi_, LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+            ++hogComputations_;
+        }
+        const StrongClassifier& stage = strongClassifiers[s];
+        score = stage.totalScore(r, hogImage_, i);
+        if (score < stage.getThreshold()) return false;
+    }
+    return true;
+}
+
+void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image& mono,
+                                          const LQ::Image& integralImage, std::vector<AdaObject>& objects,
+                                          const LQ::BaseRect<int>& rect, int bucket, int step) {
+    const int* pShift = shiftTables_[bucket].data();
+    LQ_ASSERT_MSG(pShift[rect.right] < integralImage.width(),
+                  "ShiftX " << pShift[rect.right] << " not compatible with integral image " << integralImage.size());
+    LQ_ASSERT_MSG(pShift[rect.bottom] < integralImage.height(),
+                  "ShiftY " << pShift[rect.bottom] << " not compatible with integral image " << integralImage.size());
+
+    const size_t rmctStride = rmct.stripLength();
+    const size_t monoStride = mono.stripLength();
+    const size_t integralStride = integralImage.stripLength() / sizeof(unsigned int);
+    const unsigned int* integral = reinterpret_cast<const unsigned int*>(integralImage.data());
+    const FirstTest* testsBegin = firstTests_.data();
+    const FirstTest* testsEnd = testsBegin + firstTests_.size();
+    const int threshold = firstThreshold_;
+    const bool inlineFirst = firstStageFlag_;
+    const int start = startStage_;
+
+    for (int y = rect.top; y <= rect.bottom; y += step) {
+        const unsigned char* rmctRow = rmct.data() + y * rmctStride;
+        const unsigned char* monoRow = mono.data() + y * monoStride;
+        const unsigned int* integralRow = integral + pShift[y] * integralStride;
+        for (int x = rect.left; x <= rect.right; x += step) {
+            const unsigned char* r = rmctRow + x;
+            int score = 0;
+            if (inlineFirst) {
+                int sum = 0;
+                for (const FirstTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[r[t->offset]];
+                if (sum < threshold) continue;
+                score = sum;
+            }
+            if (!passesFrom(start, r, monoRow + x, integralRow + pShift[x], score)) continue;
+            appendObject(objects, x, y, score);
+        }
+    }
+}
+
+void CascadedClassifier::addMatchesDynamic(const LQ::Image& rmct, const LQ::Image& mono,
+                                           const LQ::Image& integralImage, std::vector<AdaObject>& objects,
+                                           const LQ::BaseRect<int>& rect, int bucket, int step) {
+    const int* pShift = shiftTables_[bucket].data();
+    LQ_ASSERT_MSG(pShift[rect.right] < integralImage.width(),
+                  "ShiftX " << pShift[rect.right] << " not compatible with integral image " << integralImage.size());
+    LQ_ASSERT_MSG(pShift[rect.bottom] < integralImage.height(),
+                  "ShiftY " << pShift[rect.bottom] << " not compatible with integral image " << integralImage.size());
+
+    AbsFeature feature(*strongClassifiers.front().activeHaar(), firstThreshold_);
+    feature.setStripLength(static_cast<uint16_t>(integralImage.stripLength()));
+    const size_t rmctStride = rmct.stripLength();
+    const size_t monoStride = mono.stripLength();
+    const size_t integralStride = integralImage.stripLength() / sizeof(unsigned int);
+    const unsigned int* integral = reinterpret_cast<const unsigned int*>(integralImage.data());
+
+    for (int y = rect.top; y <= rect.bottom; y += step) {
+        const unsigned char* rmctRow = rmct.data() + y * rmctStride;
+        const unsigned char* monoRow = mono.data() + y * monoStride;
+        const unsigned int* integralRow = integral + pShift[y] * integralStride;
+        for (int x = rect.left; x <= rect.right; x += step) {
+            const unsigned int* i = integralRow + pShift[x];
+            if (!feature.passes(i)) continue;
+            int score = 0;
+            if (!passesFrom(1, rmctRow + x, monoRow + x, i, score)) continue;
+            appendObject(objects, x, y, score);
+        }
+    }
+}
+
+bool CascadedClassifier::detect(const unsigned char* rmct, const unsigned char* mono, const unsigned int* integral,
+                                unsigned int firstStage, int& score) {
+    if (firstStage >= strongClassifiers.size()) return true;
+    int value = score;
+    if (!passesFrom(static_cast<int>(firstStage), rmct, mono, integral, value)) {
+        score = value;
+        return false;
+    }
+    score = value;
+    return true;
+}

@@ -1,0 +1,96 @@
+#pragma once
+// A series of stages over a window of fixed size, and the integer scan of one pyramid
+// layer. Almost every window ends in the first stage, which the scan evaluates inline.
+
+#include <istream>
+#include <map>
+#include <ostream>
+#include <string>
+#include <vector>
+
+#include "AdaObject.h"
+#include "ClassifierProperties.h"
+#include "LQ_Image.h"
+#include "StrongClassifier.h"
+
+class CascadedClassifier : public ClassifierProperties {
+public:
+    CascadedClassifier() = default;
+    // a copy carries the run-time state, re-pointed at its own stages
+    CascadedClassifier(const CascadedClassifier& other) : ClassifierProperties(other) { *this = other; }
+    CascadedClassifier& operator=(const CascadedClassifier& other);
+
+    void addStrongClassifier(const StrongClassifier& stage) { strongClassifiers.push_back(stage); }
+
+    void activate(int rmctStride, int monoStride, int integralStride, float scale,
+                  const LQ::BaseSize<int>& monoSize);
+    // Appends one object per window whose object lies in roi (layer coordinates) and that
+    // passes every stage. integral has the base image's resolution, scale times the layer's.
+    void addMatches(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integral,
+                    std::vector<AdaObject>& objects, const LQ::BaseRect<int>& roi, float scale, int step);
+    void addMatches(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integral,
+                    std::vector<AdaObject>& objects, float scale, int step);
+    // rect holds the first and the last window position, both inclusive
+    void addMatchesStatic(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integralImage,
+                          std::vector<AdaObject>& objects, const LQ::BaseRect<int>& rect, int bucket, int step);
+    void addMatchesDynamic(const LQ::Image& rmct, const LQ::Image& mono, const LQ::Image& integralImage,
+                           std::vector<AdaObject>& objects, const LQ::BaseRect<int>& rect, int bucket, int step);
+    // one window from firstStage on; true when it passes every stage from there
+    bool detect(const unsigned char* rmct, const unsigned char* mono, const unsigned int* integral,
+                unsigned int firstStage, int& score);
+
+    void calculateHogRoi();
+    // a quarter turn, and the mirror image; both need window coordinates, so they come
+    // before the first activation
+    void rotate();
+    void flipVertically();
+
+    // the cascade record of a ring file
+    void save(std::ostream& stream) const;
+    bool load(std::istream& stream);
+    // the tables and building code of the generated source
+    void writeClassifier(std::ostream& stream, const std::string& prefix) const;
+
+    void setName(const std::string& name);
+    const std::vector<StrongClassifier>& stages() const { return strongClassifiers; }
+    std::vector<StrongClassifier>& stages() { return strongClassifiers; }
+    const LQ::BaseRect<int>& getHogRoi() const { return hogRoi_; }
+    int getFirstHogStage() const { return firstHogStage_; }
+    // windows that reached the first HOG stage since construction: lets tests see that
+    // the integral HOG is made only when needed
+    long long hogComputations() const { return hogComputations_; }
+
+    bool operator==(const CascadedClassifier& other) const {
+        return ClassifierProperties::operator==(other) && baseSize_ == other.baseSize_ &&
+               strongClassifiers == other.strongClassifiers;
+    }
+
+    std::vector<StrongClassifier> strongClassifiers;
+
+private:
+    void resetRunTimeState();
+    void appendObject(std::vector<AdaObject>& objects, int x, int y, int score) const;
+    // the stages from first on, with the integral HOG computed on reaching its first stage
+    bool passesFrom(int first, const unsigned char* r, const unsigned char* m, const unsigned int* i, int& score);
+
+    struct FirstTest {
+        const LQ::schar* table;
+        int offset;
+    };
+
+    LQ::Image hogImage_;
+    bool hogRoiComputed_ = false;
+    LQ::BaseRect<int> hogRoi_;
+    int monoStride_ = 0;
+    int firstHogStage_ = 0x7fffffff;
+    bool firstStageFlag_ = false;
+    int startStage_ = 0;
+    int firstThreshold_ = INT_MIN;
+    std::map<int, std::vector<int>> shiftTables_;
+    const StrongClassifier* firstStage_ = nullptr;
+    // the first stage's RMCT classifiers packed for the inline test
+    std::vector<FirstTest> firstTests_;
+    // the ring's name shared by every cascade of that name, so hits compare names by pointer
+    const char* sharedName_ = "";
+    long long hogComputations_ = 0;
+};

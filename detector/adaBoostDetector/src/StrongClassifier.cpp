@@ -1,0 +1,126 @@
+#include "StrongClassifier.h"
+
+#include <algorithm>
+#include <cmath>
+
+#include "LQ_Utils.h"
+
+int scaleBucket(float scale) {
+    // log of the float 1.2
+    return static_cast<int>(std::log(static_cast<double>(scale)) / 0.18232159653038368 + 0.5);
+}
+
+StrongClassifier& StrongClassifier::operator=(const StrongClassifier& other) {
+    if (this == &other) return *this;
+    rmct_ = other.rmct_;
+    haar_ = other.haar_;
+    hog_ = other.hog_;
+    resizedHaar_ = other.resizedHaar_;
+    threshold_ = other.threshold_;
+    clearActive();
+    if (other.rmctBegin_ != other.rmctEnd_) {
+        rmctBegin_ = rmct_.data();
+        rmctEnd_ = rmct_.data() + rmct_.size();
+    }
+    if (other.activeBucket_ >= 0) {
+        activeBucket_ = other.activeBucket_;
+        haarBegin_ = resizedHaar_[activeBucket_].data();
+        haarEnd_ = haarBegin_ + resizedHaar_[activeBucket_].size();
+    }
+    if (other.hogBegin_ != other.hogEnd_) {
+        hogBegin_ = hog_.data();
+        hogEnd_ = hog_.data() + hog_.size();
+    }
+    return *this;
+}
+
+void StrongClassifier::addHogClassifier(const WeakClassifierHog& hogClassifier) {
+    LQ_ASSERT(hogClassifier.getSector() < static_cast<LQ::uchar>(WeakClassifierHog::NUM_SECTORS));
+    hog_.push_back(hogClassifier);
+}
+
+void StrongClassifier::clearActive() {
+    rmctBegin_ = rmctEnd_ = nullptr;
+    haarBegin_ = haarEnd_ = nullptr;
+    hogBegin_ = hogEnd_ = nullptr;
+    activeBucket_ = -1;
+}
+
+void StrongClassifier::reset() {
+    rmct_.clear();
+    haar_.clear();
+    hog_.clear();
+    resizedHaar_.clear();
+    clearActive();
+}
+
+void StrongClassifier::activate(int rmctStride, int integralStride, float scale) {
+    if (rmct_.empty()) {
+        rmctBegin_ = rmctEnd_ = nullptr;
+    } else {
+        rmctBegin_ = rmct_.data();
+        rmctEnd_ = rmct_.data() + rmct_.size();
+        const WeakClassifierRmct& first = rmct_.front();
+        const bool current = first.point.y != 0 && (first.offset - first.point.x) / first.point.y == rmctStride;
+        if (!current)
+            for (WeakClassifierRmct& classifier : rmct_) classifier.setStride(rmctStride);
+    }
+
+    if (haar_.empty()) {
+        haarBegin_ = haarEnd_ = nullptr;
+        activeBucket_ = -1;
+    } else {
+        const int k = scaleBucket(scale);
+        if (static_cast<int>(resizedHaar_.size()) < k + 1) resizedHaar_.resize(k + 1);
+        std::vector<WeakClassifierHaar>& set = resizedHaar_[k];
+        // the first scale that reaches a bucket fixes its rectangles
+        if (set.size() != haar_.size()) {
+            set.resize(haar_.size());
+            for (size_t i = 0; i < haar_.size(); ++i) set[i].resize(haar_[i], scale);
+        }
+        if (set.front().stripLength * 4u != static_cast<unsigned>(integralStride))
+            for (WeakClassifierHaar& classifier : set) classifier.setStripLength(integralStride >> 2);
+        activeBucket_ = k;
+        haarBegin_ = set.data();
+        haarEnd_ = set.data() + set.size();
+    }
+
+    if (hog_.empty()) {
+        hogBegin_ = hogEnd_ = nullptr;
+    } else {
+        hogBegin_ = hog_.data();
+        hogEnd_ = hog_.data() + hog_.size();
+    }
+}
+
+void StrongClassifier::rotate(const LQ::BaseSize<int>& size) {
+    for (WeakClassifierRmct& classifier : rmct_) classifier.rotate(size);
+    for (WeakClassifierHaar& classifier : haar_) classifier.rotate(size);
+    for (WeakClassifierHog& classifier : hog_) classifier.rotate(size);
+    resizedHaar_.clear();
+    clearActive();
+}
+
+void StrongClassifier::flip(const LQ::BaseSize<int>& size) {
+    for (WeakClassifierRmct& classifier : rmct_) classifier.flip(size);
+    for (WeakClassifierHaar& classifier : haar_) classifier.flip(size);
+    for (WeakClassifierHog& classifier : hog_) classifier.flip(size);
+    resizedHaar_.clear();
+    clearActive();
+}
+
+LQ::BaseRect<int> StrongClassifier::calculateHogRoi() const {
+    if (hog_.empty()) return LQ::BaseRect<int>();
+    LQ::BaseRect<int> roi = hog_.front().block;
+    for (const WeakClassifierHog& classifier : hog_) {
+        roi.left = std::min(roi.left, classifier.block.left);
+        roi.top = std::min(roi.top, classifier.block.top);
+        roi.right = std::max(roi.right, classifier.block.right);
+        roi.bottom = std::max(roi.bottom, classifier.block.bottom);
+    }
+    return roi.resize(1, 1);
+}
+
+void StrongClassifier::moveHogRoi(const LQ::BaseRect<int>& roi) {
+    for (WeakClassifierHog& classifier : hog_) classifier.moveRoi(roi);
+}

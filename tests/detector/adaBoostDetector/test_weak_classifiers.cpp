@@ -1,0 +1,294 @@
+#include <gtest/gtest.h>
+
+#include <random>
+#include <sstream>
+#include <vector>
+
+#include "LQ_Integral.h"
+#include "LQ_RmctTransform.h"
+#include "StrongClassifier.h"
+#include "TestImages.h"
+#include "WeakClassifier.h"
+
+using LQ::BasePoint;
+using LQ::BaseRect;
+using LQ::BaseSize;
+using LQ::Image;
+
+namespace {
+
+std::vector<LQ::schar> randomTable(unsigned seed) {
+    std::mt19937 random(seed);
+    std::vector<LQ::schar> table(256);
+    for (LQ::schar& v : table) v = static_cast<LQ::schar>(static_cast<int>(random() % 256) - 128);
+    return table;
+}
+
+// the image turned as rotatePointOnSize turns a point: new(y, W - 1 - x) = old(x, y)
+Image turned(const Image& image) {
+    Image result(BaseSize<int>(image.height(), image.width()), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < image.height(); ++y)
+        for (int x = 0; x < image.width(); ++x) {
+            const BasePoint<int> p = rotatePointOnSize(BasePoint<int>(x, y), image.size());
+            result.pixel(p.x, p.y)[0] = image.pixel(x, y)[0];
+        }
+    return result;
+}
+
+Image mirrored(const Image& image) {
+    Image result(image.size(), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < image.height(); ++y)
+        for (int x = 0; x < image.width(); ++x) result.pixel(image.width() - 1 - x, y)[0] = image.pixel(x, y)[0];
+    return result;
+}
+
+long long boxSum(const Image& image, const BaseRect<int>& r) {
+    long long sum = 0;
+    for (int y = r.top; y < r.bottom; ++y)
+        for (int x = r.left; x < r.right; ++x) sum += image.pixel(x, y)[0];
+    return sum;
+}
+
+}  // namespace
+
+// The bit permutations must be exactly what a turned or mirrored image does to its census
+// codes, or rotated cascades would look for other patterns than the trained one.
+TEST(WeakClassifiers, BitMatricesFollowTheImage) {
+    EXPECT_EQ(WeakClassifierRmct::bitRotationMatrix[1], 32);
+    EXPECT_EQ(WeakClassifierRmct::bitFlipMatrix[1], 4);
+    for (const int* m : {WeakClassifierRmct::bitRotationMatrix, WeakClassifierRmct::bitFlipMatrix}) {
+        EXPECT_EQ(m[0], 0);
+        EXPECT_EQ(m[255], 255);
+    }
+    for (int code = 0; code < 256; ++code) {
+        int r = code;
+        for (int k = 0; k < 4; ++k) r = WeakClassifierRmct::bitRotationMatrix[r];
+        EXPECT_EQ(r, code);
+        EXPECT_EQ(WeakClassifierRmct::bitFlipMatrix[WeakClassifierRmct::bitFlipMatrix[code]], code);
+    }
+
+    const Image image = randomImage(13, 9, LQ::COLOR_MODE_MONO, 5);
+    Image rmct, rmctTurned, rmctMirrored;
+    LQ::computeRmct(image, rmct);
+    LQ::computeRmct(turned(image), rmctTurned);
+    LQ::computeRmct(mirrored(image), rmctMirrored);
+    for (int y = 1; y < image.height() - 1; ++y)
+        for (int x = 1; x < image.width() - 1; ++x) {
+            const int code = rmct.pixel(x, y)[0];
+            const BasePoint<int> p = rotatePointOnSize(BasePoint<int>(x, y), image.size());
+            const BasePoint<int> q = flipPointOnSize(BasePoint<int>(x, y), image.size());
+            ASSERT_EQ(rmctTurned.pixel(p.x, p.y)[0], WeakClassifierRmct::bitRotationMatrix[code]) << x << "," << y;
+            ASSERT_EQ(rmctMirrored.pixel(q.x, q.y)[0], WeakClassifierRmct::bitFlipMatrix[code]) << x << "," << y;
+        }
+}
+
+TEST(WeakClassifiers, TurnsAndMirrorsComeBackToTheOriginal) {
+    const BaseSize<int> window(24, 29);
+    const BaseSize<int> turnedWindow(29, 24);
+    EXPECT_EQ(rotatePointOnSize(BasePoint<int>(0, 0), window), BasePoint<int>(0, 23));
+    EXPECT_EQ(rotatePointOnSize(BasePoint<int>(0, 23), turnedWindow), BasePoint<int>(23, 28));
+
+    std::vector<LQ::schar> table = randomTable(1);
+    WeakClassifierRmct rmct(BasePoint<int>(3, 7));
+    rmct.setData(table.data());
+    rmct.setStride(100);
+    WeakClassifierHaar haar;
+    haar.set(BaseRect<int>(2, 3, 14, 11), BaseRect<int>(4, 5, 8, 9));
+    haar.setData(table.data());
+    haar.setStripLength(41);
+    WeakClassifierHog hog;
+    hog.setBlock(BaseRect<int>(2, 4, 12, 14));
+    hog.setCell(BaseRect<int>(4, 6, 9, 10));
+    hog.setSector(1);
+    hog.setData(table.data());
+    hog.setRowLength(70);
+
+    WeakClassifierRmct r = rmct;
+    WeakClassifierHaar h = haar;
+    WeakClassifierHog g = hog;
+    for (int k = 0; k < 4; ++k) {
+        const BaseSize<int>& size = k % 2 ? turnedWindow : window;
+        r.rotate(size);
+        h.rotate(size);
+        g.rotate(size);
+        if (k < 3) {
+            EXPECT_FALSE(r == rmct);
+            EXPECT_FALSE(h == haar);
+        }
+    }
+    EXPECT_TRUE(r == rmct);
+    EXPECT_EQ(r.offset, rmct.offset);
+    EXPECT_TRUE(h == haar);
+    EXPECT_EQ(h.firstOffset, haar.firstOffset);
+    EXPECT_TRUE(g == hog);
+    EXPECT_EQ(g.cellOffset, hog.cellOffset);
+    EXPECT_EQ(g.blockEnd, hog.blockEnd);
+
+    r.flip(window);
+    h.flip(window);
+    g.flip(window);
+    EXPECT_EQ(g.getSector(), 5);
+    r.flip(window);
+    h.flip(window);
+    g.flip(window);
+    EXPECT_TRUE(r == rmct && h == haar && g == hog);
+
+    // a turn moves an orientation by three bins, a mirror negates it
+    WeakClassifierHog sector;
+    sector.setSector(4);
+    sector.rotate(window);
+    EXPECT_EQ(sector.getSector(), 1);
+    for (int s : {0, 3}) {
+        sector.setSector(s);
+        sector.flip(window);
+        EXPECT_EQ(sector.getSector(), s);
+    }
+
+    // the two transforms don't commute
+    WeakClassifierRmct a = rmct, b = rmct;
+    a.flip(window);
+    a.rotate(window);
+    b.rotate(window);
+    b.flip(turnedWindow);
+    EXPECT_FALSE(a == b);
+}
+
+// Evaluation against sums taken pixel by pixel, through offsets made for real strides.
+TEST(WeakClassifiers, LookUpIndicesMatchDirectSums) {
+    Image parent;
+    const Image image = randomView(30, 26, LQ::COLOR_MODE_MONO, 9, parent);
+    Image integral;
+    LQ::computeIntegral(image, integral);
+    const unsigned int* sums = reinterpret_cast<const unsigned int*>(integral.data());
+    const int stride = static_cast<int>(integral.stripLength() / 4);
+    std::vector<LQ::schar> table = randomTable(2);
+
+    struct Case {
+        BaseRect<int> first, second;
+    };
+    for (const Case& c : {Case{BaseRect<int>(1, 2, 21, 18), BaseRect<int>(5, 6, 11, 10)},
+                          Case{BaseRect<int>(0, 0, 30, 26), BaseRect<int>()},
+                          Case{BaseRect<int>(3, 3, 9, 7), BaseRect<int>(3, 3, 9, 7)}}) {
+        WeakClassifierHaar haar;
+        haar.set(c.first, c.second, 99);
+        haar.setData(table.data());
+        haar.setStripLength(stride);
+        const long long a1 = c.first.area(), a2 = c.second.area();
+        const long long s1 = boxSum(image, c.first), s2 = boxSum(image, c.second);
+        long long expected = 0;
+        if (c.second.width() == 0)
+            expected = 127 + s1 / (2 * a1);
+        else if (a1 != a2)
+            expected = 127 + (a1 * s2 - a2 * s1) / (2 * a2 * (a1 - a2));
+        EXPECT_EQ(haar.index(sums), expected) << c.first;
+    }
+    Image zero(BaseSize<int>(8, 8), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < 8; ++y)
+        for (int x = 0; x < 8; ++x) zero.pixel(x, y)[0] = 0;
+    Image zeroIntegral;
+    LQ::computeIntegral(zero, zeroIntegral);
+    WeakClassifierHaar single;
+    single.set(BaseRect<int>(1, 1, 5, 6), BaseRect<int>());
+    single.setStripLength(zeroIntegral.stripLength() / 4);
+    EXPECT_EQ(single.index(reinterpret_cast<const unsigned int*>(zeroIntegral.data())), 127);
+
+    // HOG: the bin's share of its block, against per-pixel sums of the integral HOG
+    const BaseRect<int> roi(2, 3, 26, 22);
+    Image hogImage;
+    LQ::computeIntegralHog(image, hogImage, roi, LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+    const unsigned int* h = reinterpret_cast<const unsigned int*>(hogImage.data());
+    auto channelSum = [&](const BaseRect<int>& r, int channel) {
+        auto at = [&](int x, int y) { return h[(y * hogImage.width() + x) * 7 + channel]; };
+        return at(r.right, r.bottom) + at(r.left, r.top) - at(r.right, r.top) - at(r.left, r.bottom);
+    };
+    for (int sector = 0; sector < 6; ++sector) {
+        WeakClassifierHog hog;
+        hog.setBlock(BaseRect<int>(4, 5, 20, 19));
+        hog.setCell(BaseRect<int>(6, 8, 12, 13));
+        hog.setSector(sector);
+        hog.setData(table.data());
+        hog.moveRoi(roi);
+        const BaseRect<int> cell(4, 5, 10, 10), block(2, 2, 18, 16);
+        unsigned long long expected = (static_cast<unsigned long long>(channelSum(cell, sector)) << 8) /
+                                      (channelSum(block, 6) + 1ull);
+        EXPECT_EQ(hog.index(h), static_cast<int>(expected)) << sector;
+        EXPECT_LT(hog.index(h), 256);
+    }
+    Image flat(BaseSize<int>(12, 12), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < 12; ++y)
+        for (int x = 0; x < 12; ++x) flat.pixel(x, y)[0] = 77;
+    LQ::computeIntegralHog(flat, hogImage, flat.rect(), LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+    WeakClassifierHog quiet;
+    quiet.setBlock(BaseRect<int>(1, 1, 10, 10));
+    quiet.setCell(BaseRect<int>(2, 2, 5, 5));
+    quiet.moveRoi(flat.rect());
+    EXPECT_EQ(quiet.index(reinterpret_cast<const unsigned int*>(hogImage.data())), 0);
+}
+
+TEST(WeakClassifiers, AbsFeaturePassesTheTablesPassingRange) {
+    std::vector<LQ::schar> table(256, -5);
+    for (int i = 130; i <= 150; ++i) table[i] = 10;
+    table[140] = -1;  // inside the range: passes anyway
+    WeakClassifierHaar haar;
+    haar.set(BaseRect<int>(0, 0, 1, 1), BaseRect<int>());
+    haar.setData(table.data());
+    AbsFeature feature(haar, 3);
+    feature.setStripLength(2 * 4);
+    unsigned int fake[4] = {0, 0, 0, 0};
+    // rectangle sums of pixels are never negative
+    for (int s = 0; s <= 257; ++s) {
+        fake[3] = static_cast<unsigned int>(s);
+        const int index = 127 + s / 2;
+        EXPECT_EQ(feature.passes(fake), index >= 130 && index <= 150) << s;
+    }
+    std::vector<LQ::schar> low(256, -5);
+    haar.setData(low.data());
+    AbsFeature none(haar, 3);
+    EXPECT_GT(none.lowerBound, none.upperBound);
+}
+
+TEST(WeakClassifiers, TextAndSourceForms) {
+    std::vector<LQ::schar> table = randomTable(3);
+    WeakClassifierRmct rmct(BasePoint<int>(3, 4));
+    rmct.setData(table.data());
+    WeakClassifierHaar haar;
+    haar.set(BaseRect<int>(1, 2, 9, 8), BaseRect<int>(2, 3, 5, 6));
+    haar.setData(table.data());
+    WeakClassifierHog hog;
+    hog.setBlock(BaseRect<int>(1, 2, 7, 9));
+    hog.setCell(BaseRect<int>(2, 3, 4, 5));
+    hog.setSector(4);
+    hog.setData(table.data());
+
+    std::stringstream text;
+    rmct.basicSave(text);
+    haar.basicSave(text);
+    hog.basicSave(text);
+    WeakClassifierRmct rmct2;
+    WeakClassifierHaar haar2;
+    WeakClassifierHog hog2;
+    rmct2.basicLoad(text);
+    haar2.basicLoad(text);
+    hog2.basicLoad(text);
+    EXPECT_TRUE(rmct2 == rmct);
+    EXPECT_TRUE(haar2 == haar);
+    EXPECT_EQ(haar2.divisor, haar.divisor);
+    EXPECT_TRUE(hog2 == hog);
+    EXPECT_NE(rmct2.table, rmct.table);
+
+    std::ostringstream line;
+    haar.basicSave(line);
+    const std::string expected = "2 1 9 8\t3 2 5 6\t" + std::to_string(table[0]) + " ";
+    EXPECT_EQ(line.str().substr(0, expected.size()), expected);
+
+    std::ostringstream source;
+    rmct.writeWeakClassifier(source);
+    hog.writeWeakClassifier(source);
+    const std::string s = source.str();
+    EXPECT_EQ(s.rfind("\t{3, 4," + std::to_string(table[0]) + ",", 0), 0u);
+    EXPECT_NE(s.find("\t{1, 2, 7, 9, 2, 3, 4, 5, 4," + std::to_string(table[0]) + ","), std::string::npos);
+    EXPECT_EQ(s.substr(s.size() - 3), "},\n");
+
+    WeakClassifierHaar empty;
+    EXPECT_FALSE(empty == empty);
+}
