@@ -14,7 +14,7 @@
 class ClassifierProperties {
 public:
     // the strength of one hit's vote for its hand
-    static const int SIDE_SCORE = 100;
+    static constexpr int SIDE_SCORE = 100;
 
     struct Transformation {
         bool possible = false;

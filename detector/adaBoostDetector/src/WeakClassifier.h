@@ -61,7 +61,7 @@ private:
 
 class WeakClassifierHaar {
 public:
-    static const int TABLE_SIZE = 256;
+    static constexpr int TABLE_SIZE = 256;
 
     WeakClassifierHaar() = default;
 
@@ -112,8 +112,8 @@ public:
 
 class WeakClassifierHog {
 public:
-    static const int TABLE_SIZE = 256;
-    static const int NUM_SECTORS = 6;
+    static constexpr int TABLE_SIZE = 256;
+    static constexpr int NUM_SECTORS = 6;
 
     WeakClassifierHog() = default;
 

@@ -1,0 +1,288 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <new>
+#include <vector>
+
+#include "CascadedClassifier.h"
+#include "LQ_Integral.h"
+#include "LQ_RmctTransform.h"
+#include "LogCapture.h"
+
+using LQ::BasePoint;
+using LQ::BaseRect;
+using LQ::BaseSize;
+using LQ::Image;
+
+// Every allocation of this test program is counted, so that a scan can show it makes none.
+namespace {
+std::atomic<long> allocations{0};
+}
+void* operator new(std::size_t size) {
+    ++allocations;
+    if (void* p = std::malloc(size ? size : 1)) return p;
+    throw std::bad_alloc();
+}
+void operator delete(void* p) noexcept { std::free(p); }
+void operator delete(void* p, std::size_t) noexcept { std::free(p); }
+
+namespace {
+
+Image flat(int width, int height, unsigned char value) {
+    Image image(BaseSize<int>(width, height), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < height; ++y)
+        for (int x = 0; x < width; ++x) image.pixel(x, y)[0] = value;
+    return image;
+}
+
+// A table that scores 1 for one code and -1 for every other.
+std::vector<LQ::schar> oneCode(int code) {
+    std::vector<LQ::schar> table(256, -1);
+    table[code] = 1;
+    return table;
+}
+
+struct Features {
+    Image rmct, integral;
+    explicit Features(const Image& mono) {
+        LQ::computeRmct(mono, rmct);
+        LQ::computeIntegral(mono, integral);
+    }
+};
+
+// One stage of one RMCT classifier at point (3, 2) of a 9 x 7 window.
+CascadedClassifier singlePointCascade(std::vector<LQ::schar>& table) {
+    WeakClassifierRmct weak(BasePoint<int>(3, 2));
+    weak.setData(table.data());
+    StrongClassifier stage;
+    stage.addRmctClassifier(weak);
+    stage.setThreshold(1);
+    CascadedClassifier cascade;
+    cascade.setMonoSize(BaseSize<int>(9, 7));
+    cascade.setName("dot");
+    cascade.setAngle(0);
+    cascade.addStrongClassifier(stage);
+    return cascade;
+}
+
+}  // namespace
+
+// A single bright pixel gives its upper-left neighbour exactly the code of "bright at
+// (+1, +1)". A classifier on that code must fire at exactly one window, and its turned and
+// mirrored copies at the neighbour in the turned and mirrored direction.
+TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
+    Image mono = flat(40, 30, 100);
+    mono.pixel(20, 15)[0] = 250;
+    Features f(mono);
+    const int code = f.rmct.pixel(19, 14)[0];
+    ASSERT_NE(code, 0);
+    EXPECT_EQ(f.rmct.pixel(5, 5)[0], 0);
+
+    std::vector<LQ::schar> table = oneCode(code);
+    CascadedClassifier cascade = singlePointCascade(table);
+    EXPECT_EQ(cascade.getBaseSize(), BaseSize<int>(9, 7));
+    EXPECT_EQ(cascade.getObjectCenter(), BasePoint<int>(4, 3));
+
+    std::vector<AdaObject> objects;
+    cascade.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    ASSERT_EQ(objects.size(), 1u);
+    // the window's top-left lies at (19 - 3, 14 - 2)
+    EXPECT_EQ(objects[0].center, BasePoint<int>(16 + 4, 12 + 3));
+    EXPECT_EQ(objects[0].score, 1);
+    EXPECT_EQ(objects[0].side, ClassifierProperties::SIDE_SCORE);
+    EXPECT_EQ(objects[0].weight, 1);
+    EXPECT_STREQ(objects[0].name, "dot");
+
+    // step 2 visits only even positions from the first one: x = 16 is reached, y = 12 too
+    objects.clear();
+    cascade.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 2);
+    EXPECT_EQ(objects.size(), 1u);
+    objects.clear();
+    cascade.addMatches(f.rmct, mono, f.integral, objects, BaseRect<int>(1, 0, 40, 30), 1.0f, 2);
+    EXPECT_TRUE(objects.empty());
+
+    // turned: the window is 7 x 9 and the dot's neighbour turns with it
+    std::vector<LQ::schar> table2 = oneCode(code);
+    CascadedClassifier turned = singlePointCascade(table2);
+    turned.rotate();
+    EXPECT_EQ(turned.getAngle(), 90);
+    EXPECT_EQ(turned.getMonoSize(), BaseSize<int>(7, 9));
+    objects.clear();
+    turned.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    ASSERT_EQ(objects.size(), 1u);
+    EXPECT_EQ(objects[0].angle, 90);
+    // every variant puts its object centre on the dot
+    EXPECT_EQ(objects[0].center, BasePoint<int>(20, 15));
+
+    CascadedClassifier mirrored = singlePointCascade(table2);
+    mirrored.flipVertically();
+    EXPECT_EQ(mirrored.getSide(), LQ::Side::LEFT);
+    objects.clear();
+    mirrored.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    ASSERT_EQ(objects.size(), 1u);
+    EXPECT_EQ(objects[0].side, -ClassifierProperties::SIDE_SCORE);
+    // the mirrored code belongs to the upper-right neighbour (21, 14); the point moved to (5, 2)
+    EXPECT_EQ(objects[0].center, BasePoint<int>(21 - 5 + 4, 14 - 2 + 3));
+}
+
+// The windows may reach the layer's edge but not beyond; a layer smaller than the window
+// yields nothing and activates nothing.
+TEST(CascadeScan, WindowsStayInsideTheLayer) {
+    std::vector<LQ::schar> all(256, 1);
+    CascadedClassifier cascade = singlePointCascade(all);
+    Image mono = flat(12, 9, 80);
+    Features f(mono);
+    std::vector<AdaObject> objects;
+    cascade.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    // positions 0..3 by 0..2
+    ASSERT_EQ(objects.size(), 12u);
+    EXPECT_EQ(objects.front().center, BasePoint<int>(4, 3));
+    EXPECT_EQ(objects.back().center, BasePoint<int>(3 + 4, 2 + 3));
+
+    Image small = flat(8, 9, 80);
+    Features g(small);
+    CascadedClassifier fresh = singlePointCascade(all);
+    objects.clear();
+    fresh.addMatches(g.rmct, small, g.integral, objects, 1.0f, 1);
+    EXPECT_TRUE(objects.empty());
+    // not activated: a turn is still allowed and the scan of a larger layer works after it
+    fresh.rotate();
+    Image tall = flat(7, 9, 80);
+    Features h(tall);
+    fresh.addMatches(h.rmct, tall, h.integral, objects, 1.0f, 1);
+    EXPECT_EQ(objects.size(), 1u);
+}
+
+// Haar rectangles grow with the zoom against the full-resolution integral image; two
+// zooms of one bucket share rectangles and shift entries; the first stage of one Haar
+// classifier takes the threshold-range path and reports score 0.
+TEST(CascadeScan, HaarAtZoomAndTheRangePath) {
+    // a bright 12 x 12 square at (30, 24) in the base image
+    Image base = flat(80, 60, 20);
+    for (int y = 24; y < 36; ++y)
+        for (int x = 30; x < 42; ++x) base.pixel(x, y)[0] = 220;
+    Image integral;
+    LQ::computeIntegral(base, integral);
+    // a layer at zoom 1.2 only needs the right size here: Haar reads the integral
+    Image layer = flat(66, 50, 0);
+    Image rmct;
+    LQ::computeRmct(layer, rmct);
+
+    // the mean of the 10 x 10 middle of a 20 x 20 window at zoom 1: at least 190
+    std::vector<LQ::schar> bright(256, -1);
+    for (int i = 127 + 95; i < 256; ++i) bright[i] = 1;
+    WeakClassifierHaar haar;
+    haar.set(BaseRect<int>(5, 5, 15, 15), BaseRect<int>());
+    haar.setData(bright.data());
+    StrongClassifier stage;
+    stage.addHaarClassifier(haar);
+    stage.setThreshold(1);
+    CascadedClassifier cascade;
+    cascade.setMonoSize(BaseSize<int>(20, 20));
+    cascade.setName("square");
+    cascade.addStrongClassifier(stage);
+
+    std::vector<AdaObject> objects;
+    cascade.addMatches(rmct, layer, integral, objects, 1.2f, 1);
+    ASSERT_FALSE(objects.empty());
+    for (const AdaObject& o : objects) {
+        EXPECT_EQ(o.score, 0);
+        // the square's centre (36, 30) at zoom 1.2 is (30, 25) in the layer
+        EXPECT_NEAR(o.center.x, 30, 2);
+        EXPECT_NEAR(o.center.y, 25, 2);
+    }
+
+    // 1.25 falls in the bucket of 1.2: same rectangles, same shift table, same windows
+    std::vector<AdaObject> again;
+    cascade.addMatches(rmct, layer, integral, again, 1.25f, 1);
+    ASSERT_EQ(again.size(), objects.size());
+    for (size_t k = 0; k < objects.size(); ++k) EXPECT_EQ(again[k].center, objects[k].center);
+
+    // the same stage behind an always-passing RMCT stage takes the table path and agrees
+    std::vector<LQ::schar> all(256, 1);
+    WeakClassifierRmct any(BasePoint<int>(10, 10));
+    any.setData(all.data());
+    StrongClassifier first;
+    first.addRmctClassifier(any);
+    first.setThreshold(1);
+    CascadedClassifier twoStages;
+    twoStages.setMonoSize(BaseSize<int>(20, 20));
+    twoStages.setName("square");
+    twoStages.addStrongClassifier(first);
+    twoStages.addStrongClassifier(stage);
+    std::vector<AdaObject> table;
+    twoStages.addMatches(rmct, layer, integral, table, 1.2f, 1);
+    ASSERT_EQ(table.size(), objects.size());
+    for (size_t k = 0; k < objects.size(); ++k) {
+        EXPECT_EQ(table[k].center, objects[k].center);
+        EXPECT_GT(table[k].score, 0);
+    }
+
+    // an integral image too small for the layer at this zoom
+    Image smallIntegral;
+    LQ::computeIntegral(flat(50, 40, 0), smallIntegral);
+    LogCapture log;
+    EXPECT_THROW(cascade.addMatches(rmct, layer, smallIntegral, objects, 1.2f, 1), const char*);
+    EXPECT_NE(log.text().find("Assertion `pShift[rect.right] < integralImage.width()` failed in "), std::string::npos);
+    EXPECT_NE(log.text().find("ShiftX "), std::string::npos);
+    EXPECT_NE(log.text().find(" not compatible with integral image "), std::string::npos);
+}
+
+// Stage order: a window that fails before the first HOG stage computes no HOG; the score
+// that equals a threshold passes; the scan allocates nothing once its tables exist.
+TEST(CascadeScan, HogOnlyWhenReachedAndNoAllocation) {
+    Image mono = flat(60, 50, 90);
+    for (int y = 10; y < 30; ++y)
+        for (int x = 12; x < 26; ++x) mono.pixel(x, y)[0] = static_cast<unsigned char>(90 + 6 * (x - 12));
+    Features f(mono);
+
+    std::vector<LQ::schar> one(256, 1), none(256, -1), all(256, 2);
+    auto makeCascade = [&](bool secondPasses) {
+        CascadedClassifier cascade;
+        cascade.setMonoSize(BaseSize<int>(16, 16));
+        cascade.setName("hog");
+        WeakClassifierRmct r0(BasePoint<int>(2, 2)), r1(BasePoint<int>(9, 9));
+        r0.setData(one.data());
+        r1.setData(secondPasses ? one.data() : none.data());
+        StrongClassifier s0, s1, s2;
+        s0.addRmctClassifier(r0);
+        s0.setThreshold(1);  // equal to the sum: passes
+        s1.addRmctClassifier(r1);
+        s1.setThreshold(1);
+        WeakClassifierHog hog;
+        hog.setBlock(BaseRect<int>(2, 2, 14, 14));
+        hog.setCell(BaseRect<int>(4, 4, 8, 8));
+        hog.setSector(2);
+        hog.setData(all.data());
+        s2.addHogClassifier(hog);
+        s2.setThreshold(2);
+        cascade.addStrongClassifier(s0);
+        cascade.addStrongClassifier(s1);
+        cascade.addStrongClassifier(s2);
+        return cascade;
+    };
+
+    CascadedClassifier failing = makeCascade(false);
+    std::vector<AdaObject> objects;
+    failing.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    EXPECT_TRUE(objects.empty());
+    EXPECT_EQ(failing.hogComputations(), 0);
+    EXPECT_EQ(failing.getFirstHogStage(), 2);
+    EXPECT_EQ(failing.getHogRoi(), BaseRect<int>(1, 1, 15, 15));
+
+    CascadedClassifier passing = makeCascade(true);
+    passing.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    const size_t windows = (60 - 16 + 1) * (50 - 16 + 1);
+    EXPECT_EQ(objects.size(), windows);
+    EXPECT_EQ(passing.hogComputations(), static_cast<long long>(windows));
+    EXPECT_EQ(objects.front().score, 2);
+
+    // steady state: the same layer again with room for the hits
+    objects.clear();
+    objects.reserve(2 * windows);
+    const long before = allocations.load();
+    passing.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
+    EXPECT_EQ(allocations.load() - before, 0);
+    EXPECT_EQ(objects.size(), windows);
+}
