@@ -1,0 +1,273 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <memory>
+#include <vector>
+
+#include "AdaBoostDetector.h"
+#include "LQ_BaseDetector.h"
+#include "LQ_ImageData.h"
+#include "LQ_States.h"
+
+using LQ::BasePoint;
+using LQ::BaseRect;
+using LQ::BaseSize;
+using LQ::Image;
+using LQ::SharedPtr;
+using LQ::StateAggregator;
+
+namespace {
+
+// An "F" of bright cells on a 4 x 4 grid of 6-pixel cells: neither a turn nor a mirror of
+// it equals another, so each variant of the cascade finds only its own pose.
+const bool kF[4][4] = {{true, true, true, false},
+                       {true, false, false, false},
+                       {true, true, false, false},
+                       {true, false, false, false}};
+const int kWindow = 24;
+const unsigned char kDark = 40, kBright = 220;
+
+// Tables outlive the cascades that point into them.
+struct Tables {
+    std::vector<LQ::schar> any = std::vector<LQ::schar>(256, 1);
+    std::vector<LQ::schar> bright = std::vector<LQ::schar>(256, -20);
+    std::vector<LQ::schar> dark = std::vector<LQ::schar>(256, -20);
+    Tables() {
+        for (int i = 127 + 25; i < 256; ++i) bright[i] = 1;
+        for (int i = 0; i <= 127 - 15; ++i) dark[i] = 1;
+    }
+};
+
+// A census stage that every window passes, then one Haar classifier per cell: the cell
+// against the rest of the window, brighter or darker as the F says.
+CascadedClassifier fCascade(Tables& tables) {
+    CascadedClassifier cascade;
+    cascade.setMonoSize(BaseSize<int>(kWindow, kWindow));
+    cascade.setName("F");
+    WeakClassifierRmct any(BasePoint<int>(12, 12));
+    any.setData(tables.any.data());
+    StrongClassifier first;
+    first.addRmctClassifier(any);
+    first.setThreshold(1);
+    StrongClassifier cells;
+    for (int row = 0; row < 4; ++row)
+        for (int col = 0; col < 4; ++col) {
+            WeakClassifierHaar haar;
+            haar.set(BaseRect<int>(0, 0, kWindow, kWindow), BaseRect<int>(col * 6, row * 6, col * 6 + 6, row * 6 + 6));
+            haar.setData(kF[row][col] ? tables.bright.data() : tables.dark.data());
+            cells.addHaarClassifier(haar);
+        }
+    cells.setThreshold(16);
+    cascade.addStrongClassifier(first);
+    cascade.addStrongClassifier(cells);
+    return cascade;
+}
+
+struct Pose {
+    bool flip;
+    int turns;
+};
+
+// Draws the F as the cascade variant (flipped first, then turned) sees it, scaled by s
+// with its window's top-left at (ox, oy).
+void drawF(Image& image, int ox, int oy, float s, Pose pose) {
+    const int extent = static_cast<int>(std::ceil(kWindow * s));
+    for (int y = oy; y < oy + extent && y < image.height(); ++y)
+        for (int x = ox; x < ox + extent && x < image.width(); ++x) {
+            float a = (x - ox + 0.5f) / s, b = (y - oy + 0.5f) / s;
+            if (a >= kWindow || b >= kWindow) continue;
+            for (int k = 0; k < pose.turns; ++k) {  // undo the turns
+                const float a0 = a;
+                a = kWindow - b;
+                b = a0;
+            }
+            if (pose.flip) a = kWindow - a;
+            const int col = std::min(3, static_cast<int>(a / 6)), row = std::min(3, static_cast<int>(b / 6));
+            if (kF[row][col]) image.pixel(x, y)[0] = kBright;
+        }
+}
+
+// A detector that counts its calls and may refuse: it resets the location of the hits
+// whose call numbers it is given.
+class Scripted : public LQ::BaseDetector {
+public:
+    explicit Scripted(std::vector<int> refuse = {}) : refuse_(std::move(refuse)) {}
+    void detect(SharedPtr<StateAggregator>& state) override {
+        ++calls;
+        if (std::find(refuse_.begin(), refuse_.end(), calls) != refuse_.end()) state->get<LQ::LocationState>().reset();
+    }
+    int calls = 0;
+
+private:
+    std::vector<int> refuse_;
+};
+
+AdaObject hit(int x, int score) {
+    static const char* name = "hit";
+    return AdaObject(name, BaseSize<int>(24, 24), BasePoint<int>(x, 50), 100, 1.f, 0, 1, score);
+}
+
+}  // namespace
+
+// Four Fs in four poses and three sizes: the detector with all eight variants reports
+// exactly four objects, each with its centre, size, angle and hand.
+TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
+    Tables tables;
+    const CascadedClassifier base = fCascade(tables);
+    std::vector<std::unique_ptr<CascadedClassifier>> variants;
+    for (bool flip : {false, true})
+        for (int turns = 0; turns < 4; ++turns) {
+            variants.emplace_back(new CascadedClassifier(base));
+            if (flip) variants.back()->flipVertically();
+            for (int k = 0; k < turns; ++k) variants.back()->rotate();
+        }
+    std::vector<CascadedClassifier*> cascades;
+    for (auto& c : variants) cascades.push_back(c.get());
+
+    Image scene(BaseSize<int>(320, 240), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < 240; ++y)
+        for (int x = 0; x < 320; ++x) scene.pixel(x, y)[0] = kDark;
+    struct Expected {
+        int ox, oy;
+        float scale;
+        Pose pose;
+        int angle, side;
+    };
+    const float z2 = 1.2f * 1.2f;
+    const Expected expected[] = {{30, 30, 1.f, {false, 0}, 0, 1},
+                                 {150, 40, z2, {false, 1}, 90, 1},
+                                 {60, 140, 1.2f, {true, 0}, 0, -1},
+                                 {200, 130, z2 * 1.2f, {true, 2}, -180, -1}};
+    for (const Expected& e : expected) drawF(scene, e.ox, e.oy, e.scale, e.pose);
+
+    SharedPtr<LQ::ImageData> root(new LQ::ImageData());
+    root->set(scene);
+    SharedPtr<LQ::ImagePyramidData> pyramid(new LQ::ImagePyramidData(root, 1));
+    AdaBoostDetector detector(cascades, pyramid, AdaBoostDetector::StoreTarget::CHILD_STATES, nullptr, 1, 2, 0.3f,
+                              SharedPtr<LQ::BaseDetector>(), SharedPtr<LQ::BaseDetector>(),
+                              SharedPtr<LQ::BaseDetector>(), LQ::RelativeLocation(1, BasePoint<float>(0, 0), 0, 0, 0),
+                              1000);
+    EXPECT_EQ(detector.name(), "F");
+    SharedPtr<StateAggregator> state = StateAggregator::newDetectorState();
+    detector.detect(state);
+
+    // feature images cover what the cascades touch and no more than the image
+    EXPECT_GT(detector.maxZoom(), 5.f);
+    const std::vector<SharedPtr<StateAggregator>>& found = state->get<LQ::MultiState>();
+    ASSERT_EQ(found.size(), 4u);
+    for (const Expected& e : expected) {
+        const float half = kWindow * e.scale / 2;
+        int matches = 0;
+        for (const SharedPtr<StateAggregator>& child : found) {
+            const AdaObject& object = child->get<AdaObjectState>();
+            if (std::abs(object.center.x - (e.ox + half)) > 2 + e.scale ||
+                std::abs(object.center.y - (e.oy + half)) > 2 + e.scale)
+                continue;
+            ++matches;
+            EXPECT_EQ(object.angle, e.angle) << e.ox;
+            EXPECT_EQ(object.side > 0 ? 1 : -1, e.side) << e.ox;
+            EXPECT_NEAR(object.zoom, e.scale, 0.15f * e.scale) << e.ox;
+            EXPECT_GE(object.weight, 2);
+            const LQ::ObjectLocation& location = child->get<LQ::LocationState>();
+            EXPECT_EQ(location.side, e.side > 0 ? LQ::Side::RIGHT : LQ::Side::LEFT);
+            EXPECT_NEAR(location.size.width, kWindow * e.scale, 0.15f * kWindow * e.scale);
+            EXPECT_TRUE(child->get<LQ::ParentSharedStateAggregator>() == state);
+        }
+        EXPECT_EQ(matches, 1) << "F at " << e.ox << ", " << e.oy;
+    }
+    // the frame's own object stays unset with this store target
+    EXPECT_FALSE(static_cast<const AdaObject&>(state->get<AdaObjectState>()).isSet());
+}
+
+TEST(AdaBoostDetector, ZoomsFollowTheWidthRange) {
+    Tables tables;
+    CascadedClassifier cascade = fCascade(tables);
+    AdaBoostDetector::Parameters parameters;
+    parameters.pCascadedClassifiers = {&cascade};
+    AdaBoostDetector detector(parameters);
+
+    LQ::DetectRegion region(BaseRect<int>(0, 0, 1000, 1000), LQ::BaseRange<float>(100, 150), LQ::AngleRange(),
+                            LQ::Side::BOTH);
+    detector.computeClassifierMap(region);
+    std::vector<float> widths;
+    for (const auto& entry : detector.classifierMap()) widths.push_back(24 * entry.first);
+    ASSERT_EQ(widths.size(), 3u);
+    EXPECT_NEAR(widths[0], 103.2f, 0.05f);
+    EXPECT_NEAR(widths[1], 123.8f, 0.05f);
+    EXPECT_NEAR(widths[2], 148.6f, 0.05f);
+
+    // the default region: every zoom at which the object still fits, and no other
+    region = LQ::DetectRegion(BaseRect<int>(0, 0, 300, 200), LQ::BaseRange<float>(), LQ::AngleRange(), LQ::Side::BOTH);
+    detector.computeClassifierMap(region);
+    EXPECT_EQ(detector.classifierMap().size(), 12u);  // 24 * 1.2^11 = 178 < 200 < 24 * 1.2^12
+    region.side = LQ::Side::LEFT;
+    detector.computeClassifierMap(region);
+    EXPECT_TRUE(detector.classifierMap().empty());
+
+    // rectangles: the layers' union, grown and brought to base pixels, and the integral's
+    region.side = LQ::Side::BOTH;
+    region.rect = BaseRect<int>(10, 20, 110, 90);
+    region.widthRange = LQ::BaseRange<float>(20, 30);
+    detector.computeClassifierMap(region);
+    detector.prepareRois(region);
+    ASSERT_EQ(detector.layerRois().size(), 2u);
+    EXPECT_EQ(detector.layerRois().begin()->second, BaseRect<int>(10, 20, 110, 90));
+    EXPECT_EQ(detector.integralRoi(), BaseRect<int>(10, 20, 110, 90));
+    EXPECT_FLOAT_EQ(detector.maxZoom(), 1.2f);
+    // zoom 1 gives (7, 17, 113, 93); zoom 1.2 gives (8, 16, 91, 75) grown by 3, times 1.2
+    EXPECT_EQ(detector.monoRoi(), BaseRect<int>(6, 15, 113, 93));
+}
+
+// What the verifier and the store target make of the hits, and the paths of nothing found.
+TEST(AdaBoostDetector, StoreTargetsVerifierAndLostPath) {
+    Tables tables;
+    CascadedClassifier cascade = fCascade(tables);
+    AdaBoostDetector::Parameters parameters;
+    parameters.pCascadedClassifiers = {&cascade};
+    Scripted* verifier = new Scripted({1});
+    parameters.verifier = SharedPtr<LQ::BaseDetector>(verifier);
+    parameters.storeTarget = AdaBoostDetector::StoreTarget::FIRST_OBJECT;
+    AdaBoostDetector tracker(parameters);
+
+    SharedPtr<StateAggregator> state = StateAggregator::newDetectorState();
+    EXPECT_TRUE(tracker.processAdaObjects(state, {hit(10, 1), hit(20, 2), hit(30, 3)}));
+    EXPECT_EQ(verifier->calls, 2);
+    EXPECT_EQ(static_cast<const AdaObject&>(state->get<AdaObjectState>()).center.x, 20);
+    EXPECT_FLOAT_EQ(static_cast<const LQ::ObjectLocation&>(state->get<LQ::LocationState>()).center.x, 20.f);
+
+    tracker.processDetectedState(state, false);
+    EXPECT_FALSE(static_cast<const AdaObject&>(state->get<AdaObjectState>()).isSet());
+    EXPECT_FALSE(static_cast<const LQ::ObjectLocation&>(state->get<LQ::LocationState>()).isSet());
+
+    // a trigger lists every survivor; nothing found keeps the frame's location
+    Scripted* lost = new Scripted();
+    parameters.verifier = SharedPtr<LQ::BaseDetector>();
+    parameters.onLost = SharedPtr<LQ::BaseDetector>(lost);
+    parameters.storeTarget = AdaBoostDetector::StoreTarget::CHILD_STATES;
+    parameters.maxObjects = 1000;
+    AdaBoostDetector trigger(parameters);
+    SharedPtr<StateAggregator> frame = StateAggregator::newDetectorState();
+    EXPECT_TRUE(trigger.processAdaObjects(frame, {hit(10, 1), hit(60, 2)}));
+    EXPECT_EQ(frame->get<LQ::MultiState>().size(), 2u);
+    trigger.parameters().maxObjects = 3;
+    EXPECT_TRUE(trigger.processAdaObjects(frame, {hit(10, 1), hit(60, 2)}));
+    EXPECT_EQ(frame->get<LQ::MultiState>().size(), 3u);
+
+    static_cast<LQ::ObjectLocation&>(frame->get<LQ::LocationState>()) = hit(5, 1).toLocationState();
+    static_cast<AdaObject&>(frame->get<AdaObjectState>()) = hit(5, 1);
+    trigger.processDetectedState(frame, false);
+    EXPECT_FALSE(static_cast<const AdaObject&>(frame->get<AdaObjectState>()).isSet());
+    EXPECT_TRUE(static_cast<const LQ::ObjectLocation&>(frame->get<LQ::LocationState>()).isSet());
+    EXPECT_EQ(lost->calls, 1);
+
+    // widths no larger than the cascade's: no zoom, no scan, the lost path
+    Image scene(BaseSize<int>(64, 48), LQ::COLOR_MODE_MONO);
+    SharedPtr<LQ::ImageData> root(new LQ::ImageData());
+    root->set(scene);
+    trigger.parameters().pyramid = SharedPtr<LQ::ImagePyramidData>(new LQ::ImagePyramidData(root, 1));
+    trigger.parameters().regionDetector = SharedPtr<LQ::BaseDetector>(new LQ::DetectRegionSetter(
+        LQ::DetectRegion(BaseRect<int>(0, 0, 64, 48), LQ::BaseRange<float>(0, 24), LQ::AngleRange(), LQ::Side::BOTH)));
+    trigger.detect(frame);
+    EXPECT_TRUE(trigger.classifierMap().empty());
+    EXPECT_EQ(lost->calls, 2);
+}
