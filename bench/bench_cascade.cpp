@@ -244,3 +244,4 @@ BENCHMARK(BM_OpenCvLbpFaceCascade)->Unit(benchmark::kMicrosecond);
 #endif
 
 }  // namespace
+BENCHMARK_MAIN();

@@ -29,7 +29,6 @@ CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& othe
     firstThreshold_ = other.firstThreshold_;
     shiftTables_ = other.shiftTables_;
     firstStage_ = other.firstStage_ ? &strongClassifiers.front() : nullptr;
-    firstTests_ = other.firstTests_;
     sharedName_ = other.sharedName_;
     hogComputations_ = 0;
     return *this;
@@ -44,7 +43,6 @@ void CascadedClassifier::resetRunTimeState() {
     hogRoiComputed_ = false;
     hogRoi_ = LQ::BaseRect<int>();
     firstStage_ = nullptr;
-    firstTests_.clear();
     firstHogStage_ = 0x7fffffff;
     firstStageFlag_ = false;
     startStage_ = 0;
@@ -98,12 +96,6 @@ void CascadedClassifier::activate(int rmctStride, int monoStride, int integralSt
                           first.hogClassifiers().empty();
         startStage_ = firstStageFlag_ ? 1 : 0;
         firstThreshold_ = first.getThreshold();
-    }
-    // the packed copy of the first test follows the present stride; same size, no allocation
-    if (firstStageFlag_) {
-        const std::vector<WeakClassifierRmct>& rmct = firstStage_->rmctClassifiers();
-        firstTests_.resize(rmct.size());
-        for (size_t k = 0; k < rmct.size(); ++k) firstTests_[k] = FirstTest{rmct[k].table, rmct[k].offset};
     }
 }
 
@@ -177,8 +169,8 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
     const size_t monoStride = mono.stripLength();
     const size_t integralStride = integralImage.stripLength() / sizeof(unsigned int);
     const unsigned int* integral = reinterpret_cast<const unsigned int*>(integralImage.data());
-    const FirstTest* testsBegin = firstTests_.data();
-    const FirstTest* testsEnd = testsBegin + firstTests_.size();
+    const StrongClassifier::RmctTest* testsBegin = firstStage_->packedBegin();
+    const StrongClassifier::RmctTest* testsEnd = firstStage_->packedEnd();
     const int threshold = firstThreshold_;
     const bool inlineFirst = firstStageFlag_;
     const int start = startStage_;
@@ -192,7 +184,7 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
             int score = 0;
             if (inlineFirst) {
                 int sum = 0;
-                for (const FirstTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[r[t->offset]];
+                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[r[t->offset]];
                 if (sum < threshold) continue;
                 score = sum;
             }

@@ -73,11 +73,6 @@ private:
     // the stages from first on, with the integral HOG computed on reaching its first stage
     bool passesFrom(int first, const unsigned char* r, const unsigned char* m, const unsigned int* i, int& score);
 
-    struct FirstTest {
-        const LQ::schar* table;
-        int offset;
-    };
-
     LQ::Image hogImage_;
     bool hogRoiComputed_ = false;
     LQ::BaseRect<int> hogRoi_;
@@ -88,8 +83,6 @@ private:
     int firstThreshold_ = INT_MIN;
     std::map<int, std::vector<int>> shiftTables_;
     const StrongClassifier* firstStage_ = nullptr;
-    // the first stage's RMCT classifiers packed for the inline test
-    std::vector<FirstTest> firstTests_;
     // the ring's name shared by every cascade of that name, so hits compare names by pointer
     const char* sharedName_ = "";
     long long hogComputations_ = 0;

@@ -22,6 +22,11 @@ StrongClassifier& StrongClassifier::operator=(const StrongClassifier& other) {
         rmctBegin_ = rmct_.data();
         rmctEnd_ = rmct_.data() + rmct_.size();
     }
+    packed_ = other.packed_;
+    if (other.packedBegin_ != other.packedEnd_) {
+        packedBegin_ = packed_.data();
+        packedEnd_ = packed_.data() + packed_.size();
+    }
     if (other.activeBucket_ >= 0) {
         activeBucket_ = other.activeBucket_;
         haarBegin_ = resizedHaar_[activeBucket_].data();
@@ -41,6 +46,7 @@ void StrongClassifier::addHogClassifier(const WeakClassifierHog& hogClassifier) 
 
 void StrongClassifier::clearActive() {
     rmctBegin_ = rmctEnd_ = nullptr;
+    packedBegin_ = packedEnd_ = nullptr;
     haarBegin_ = haarEnd_ = nullptr;
     hogBegin_ = hogEnd_ = nullptr;
     activeBucket_ = -1;
@@ -57,6 +63,7 @@ void StrongClassifier::reset() {
 void StrongClassifier::activate(int rmctStride, int integralStride, float scale) {
     if (rmct_.empty()) {
         rmctBegin_ = rmctEnd_ = nullptr;
+        packed_.clear();
     } else {
         rmctBegin_ = rmct_.data();
         rmctEnd_ = rmct_.data() + rmct_.size();
@@ -64,7 +71,11 @@ void StrongClassifier::activate(int rmctStride, int integralStride, float scale)
         const bool current = first.point.y != 0 && (first.offset - first.point.x) / first.point.y == rmctStride;
         if (!current)
             for (WeakClassifierRmct& classifier : rmct_) classifier.setStride(rmctStride);
+        packed_.resize(rmct_.size());
+        for (size_t k = 0; k < rmct_.size(); ++k) packed_[k] = RmctTest{rmct_[k].table, rmct_[k].offset};
     }
+    packedBegin_ = packed_.empty() ? nullptr : packed_.data();
+    packedEnd_ = packedBegin_ + packed_.size();
 
     if (haar_.empty()) {
         haarBegin_ = haarEnd_ = nullptr;

@@ -30,14 +30,18 @@ public:
     // the stage's sum for the window whose first RMCT byte, first integral element and
     // integral HOG are given
     int totalScore(const unsigned char* rmct, const LQ::Image& hog, const unsigned int* integral) const {
-        int s0 = 0, s1 = 0;
-        const WeakClassifierRmct* r = rmctBegin_;
-        // two running sums: the order of integer additions doesn't change the result
-        for (; r + 1 < rmctEnd_; r += 2) {
+        int s0 = 0, s1 = 0, s2 = 0, s3 = 0;
+        const RmctTest* r = packedBegin_;
+        // four running sums: the order of integer additions doesn't change the result
+        for (; r + 3 < packedEnd_; r += 4) {
             s0 += r[0].table[rmct[r[0].offset]];
             s1 += r[1].table[rmct[r[1].offset]];
+            s2 += r[2].table[rmct[r[2].offset]];
+            s3 += r[3].table[rmct[r[3].offset]];
         }
-        if (r < rmctEnd_) s0 += r->table[rmct[r->offset]];
+        for (; r < packedEnd_; ++r) s0 += r->table[rmct[r->offset]];
+        s0 += s2;
+        s1 += s3;
         for (const WeakClassifierHaar* h = haarBegin_; h < haarEnd_; ++h) s1 += h->table[h->index(integral)];
         if (hogBegin_ != hogEnd_) {
             const unsigned int* sums = reinterpret_cast<const unsigned int*>(hog.data());
@@ -65,6 +69,14 @@ public:
     const WeakClassifierHaar* activeHaar() const { return haarBegin_; }
     size_t size() const { return rmct_.size() + haar_.size() + hog_.size(); }
 
+    // an RMCT classifier as the scan reads it: two fields side by side
+    struct RmctTest {
+        const LQ::schar* table;
+        int offset;
+    };
+    const RmctTest* packedBegin() const { return packedBegin_; }
+    const RmctTest* packedEnd() const { return packedEnd_; }
+
     bool operator==(const StrongClassifier& other) const {
         return threshold_ == other.threshold_ && rmct_ == other.rmct_ && haar_ == other.haar_ && hog_ == other.hog_;
     }
@@ -85,6 +97,10 @@ private:
     int activeBucket_ = -1;
     const WeakClassifierHog* hogBegin_ = nullptr;
     const WeakClassifierHog* hogEnd_ = nullptr;
+    // the active RMCT range packed for the scan; rebuilt at activation, same size after the first
+    std::vector<RmctTest> packed_;
+    const RmctTest* packedBegin_ = nullptr;
+    const RmctTest* packedEnd_ = nullptr;
 };
 
 // The scale bucket of a zoom: buckets span a factor of about 1.2.
