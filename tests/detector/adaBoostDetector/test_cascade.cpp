@@ -286,3 +286,55 @@ TEST(CascadeScan, HogOnlyWhenReachedAndNoAllocation) {
     EXPECT_EQ(allocations.load() - before, 0);
     EXPECT_EQ(objects.size(), windows);
 }
+
+// A whole cascade, properties and stages, comes back after four turns and after two
+// mirrors; one turn of a 40 x 35 window with an off-centre object moves the object too.
+TEST(CascadeScan, CascadeTurnsAndMirrorsComeBack) {
+    std::vector<LQ::schar> table(256);
+    for (int i = 0; i < 256; ++i) table[i] = static_cast<LQ::schar>(i * 7 % 23 - 11);
+    CascadedClassifier cascade;
+    cascade.setMonoSize(BaseSize<int>(40, 35));
+    cascade.setBaseSize(BaseSize<int>(26, 26));
+    cascade.setObjectCenter(BasePoint<int>(20, 18));
+    cascade.setName("fist");
+    cascade.setAngle(-30);
+    StrongClassifier stage;
+    WeakClassifierRmct rmct(BasePoint<int>(5, 9));
+    rmct.setData(table.data());
+    stage.addRmctClassifier(rmct);
+    WeakClassifierHaar haar;
+    haar.set(BaseRect<int>(2, 3, 30, 20), BaseRect<int>(4, 5, 10, 12));
+    haar.setData(table.data());
+    stage.addHaarClassifier(haar);
+    WeakClassifierHog hog;
+    hog.setBlock(BaseRect<int>(3, 3, 20, 30));
+    hog.setCell(BaseRect<int>(5, 6, 9, 12));
+    hog.setSector(5);
+    hog.setData(table.data());
+    stage.addHogClassifier(hog);
+    cascade.addStrongClassifier(stage);
+    EXPECT_EQ(cascade.getObjectRect(), BaseRect<int>(7, 5, 33, 31));
+
+    CascadedClassifier turned = cascade;
+    turned.rotate();
+    EXPECT_EQ(turned.getMonoSize(), BaseSize<int>(35, 40));
+    EXPECT_EQ(turned.getObjectRect(), BaseRect<int>(5, 7, 31, 33));
+    EXPECT_EQ(turned.getAngle(), 60);
+    EXPECT_FALSE(turned == cascade);
+    for (int k = 0; k < 3; ++k) turned.rotate();
+    // census offsets are set by activation; before it, turns leave them as they come
+    CascadedClassifier reference = cascade;
+    reference.activate(64, 64, 260, 1.f, reference.getMonoSize());
+    turned.activate(64, 64, 260, 1.f, turned.getMonoSize());
+    EXPECT_TRUE(turned == reference);
+
+    CascadedClassifier mirrored = cascade;
+    mirrored.flipVertically();
+    EXPECT_EQ(mirrored.getAngle(), 30);
+    EXPECT_EQ(mirrored.getSide(), LQ::Side::LEFT);
+    EXPECT_EQ(mirrored.getObjectRect(), BaseRect<int>(7, 5, 33, 31));
+    EXPECT_FALSE(mirrored == cascade);
+    mirrored.flipVertically();
+    mirrored.activate(64, 64, 260, 1.f, mirrored.getMonoSize());
+    EXPECT_TRUE(mirrored == reference);
+}
