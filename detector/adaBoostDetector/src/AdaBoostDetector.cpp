@@ -142,8 +142,17 @@ std::vector<AdaObject> AdaBoostDetector::getAdaObjects(const LQ::DetectRegion& r
         const LQ::Image& rmct = pyramid.getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get(roi);
         const LQ::Image& mono = pyramid.getByZoom(LQ::COLOR_MODE_MONO, zoom)->get(roi);
         layer.clear();
-        for (CascadedClassifier* classifier : entry.second)
+        // one integral HOG of the layer for all its cascades, made only if a window needs it
+        layerHog_.bind(mono, roi);
+        for (CascadedClassifier* classifier : entry.second) {
+            // the cascade belongs to its ring and outlives this frame: unbind even on a failed check
+            struct Binding {
+                CascadedClassifier* cascade;
+                ~Binding() { cascade->setLayerHog(nullptr); }
+            } binding{classifier};
+            classifier->setLayerHog(&layerHog_);
             classifier->addMatches(rmct, mono, integral, layer, region.rect / zoom, zoom, parameters_.step);
+        }
         if (parameters_.minWeight > 0) layer = groupAdaObjects(layer, 1, parameters_.similarity);
         for (AdaObject& object : layer) {
             object.center.x = static_cast<int>(zoom * object.center.x * m);

@@ -77,6 +77,7 @@ private:
     LQ::BaseRect<int> integralRoi_;
     LQ::BaseRect<int> monoRoi_;
     float maxZoom_ = 0.f;
+    LayerHog layerHog_;
 };
 
 std::ostream& operator<<(std::ostream& stream, AdaBoostDetector::StoreTarget::Value value);

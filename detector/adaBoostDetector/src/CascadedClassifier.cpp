@@ -31,6 +31,8 @@ CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& othe
     firstStage_ = other.firstStage_ ? &strongClassifiers.front() : nullptr;
     sharedName_ = other.sharedName_;
     hogComputations_ = 0;
+    layerHog_ = nullptr;
+    hogRowLength_ = other.hogRowLength_;
     return *this;
 }
 
@@ -47,6 +49,7 @@ void CascadedClassifier::resetRunTimeState() {
     firstStageFlag_ = false;
     startStage_ = 0;
     firstThreshold_ = INT_MIN;
+    hogRowLength_ = 0;
 }
 
 void CascadedClassifier::rotate() {
@@ -80,6 +83,33 @@ void CascadedClassifier::calculateHogRoi() {
     const LQ::BaseRect<int> monoRect(0, 0, monoSize.width + 1, monoSize.height + 1);
     LQ_ASSERT_MSG(monoRect.contains(hogRoi_), "Computed hogRoi " << hogRoi_ << " is out of monoSize + 1 " << monoRect);
     for (StrongClassifier& stage : strongClassifiers) stage.moveHogRoi(hogRoi_);
+    hogRowLength_ = ((hogRoi_.right - hogRoi_.left + 1) * 28) >> 2;
+}
+
+void CascadedClassifier::useHogRowLength(int rowLength) {
+    if (rowLength == hogRowLength_) return;
+    for (StrongClassifier& stage : strongClassifiers) stage.setHogRowLength(rowLength);
+    hogRowLength_ = rowLength;
+}
+
+const unsigned int* CascadedClassifier::windowHog(const unsigned char* m, int x, int y) {
+    const LQ::BaseRect<int> region(x + hogRoi_.left, y + hogRoi_.top, x + hogRoi_.right, y + hogRoi_.bottom);
+    if (layerHog_ && layerHog_->rect.contains(region)) {
+        LayerHog& shared = *layerHog_;
+        if (!shared.computed) {
+            LQ::computeIntegralHog(*shared.mono, shared.image, shared.rect, LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+            shared.computed = true;
+            ++hogComputations_;
+        }
+        const int width = shared.rect.width() + 1;
+        useHogRowLength(width * 7);
+        return reinterpret_cast<const unsigned int*>(shared.image.data()) +
+               (static_cast<size_t>(region.top - shared.rect.top) * width + (region.left - shared.rect.left)) * 7;
+    }
+    LQ::computeIntegralHog(m, monoStride_, hogImage_, hogRoi_, LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+    ++hogComputations_;
+    useHogRowLength(((hogRoi_.right - hogRoi_.left + 1) * 28) >> 2);
+    return reinterpret_cast<const unsigned int*>(hogImage_.data());
 }
 
 void CascadedClassifier::activate(int rmctStride, int monoStride, int integralStride, float scale,
@@ -142,15 +172,13 @@ void CascadedClassifier::appendObject(std::vector<AdaObject>& objects, int x, in
 }
 
 bool CascadedClassifier::passesFrom(int first, const unsigned char* r, const unsigned char* m,
-                                    const unsigned int* i, int& score) {
+                                    const unsigned int* i, int x, int y, int& score) {
     const int stages = static_cast<int>(strongClassifiers.size());
+    const unsigned int* hog = nullptr;
     for (int s = first; s < stages; ++s) {
-        if (s == firstHogStage_) {
-            LQ::computeIntegralHog(m, monoStride_, hogImage_, hogRoi_, LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
-            ++hogComputations_;
-        }
+        if (!hog && s >= firstHogStage_) hog = windowHog(m, x, y);
         const StrongClassifier& stage = strongClassifiers[s];
-        score = stage.totalScore(r, hogImage_, i);
+        score = stage.totalScore(r, hog, i);
         if (score < stage.getThreshold()) return false;
     }
     return true;
@@ -188,7 +216,7 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
                 if (sum < threshold) continue;
                 score = sum;
             }
-            if (!passesFrom(start, r, monoRow + x, integralRow + pShift[x], score)) continue;
+            if (!passesFrom(start, r, monoRow + x, integralRow + pShift[x], x, y, score)) continue;
             appendObject(objects, x, y, score);
         }
     }
@@ -218,7 +246,7 @@ void CascadedClassifier::addMatchesDynamic(const LQ::Image& rmct, const LQ::Imag
             const unsigned int* i = integralRow + pShift[x];
             if (!feature.passes(i)) continue;
             int score = 0;
-            if (!passesFrom(1, rmctRow + x, monoRow + x, i, score)) continue;
+            if (!passesFrom(1, rmctRow + x, monoRow + x, i, x, y, score)) continue;
             appendObject(objects, x, y, score);
         }
     }
@@ -228,7 +256,12 @@ bool CascadedClassifier::detect(const unsigned char* rmct, const unsigned char* 
                                 unsigned int firstStage, int& score) {
     if (firstStage >= strongClassifiers.size()) return true;
     int value = score;
-    if (!passesFrom(static_cast<int>(firstStage), rmct, mono, integral, value)) {
+    // a lone window has no layer position: it always gets its own integral HOG
+    LayerHog* shared = layerHog_;
+    layerHog_ = nullptr;
+    const bool passed = passesFrom(static_cast<int>(firstStage), rmct, mono, integral, 0, 0, value);
+    layerHog_ = shared;
+    if (!passed) {
         score = value;
         return false;
     }

@@ -13,6 +13,23 @@
 #include "LQ_Image.h"
 #include "StrongClassifier.h"
 
+// The integral HOG of one rectangle of a layer, computed when the first window of any
+// cascade at that layer reaches a HOG stage and shared by all of them. Block sums of a
+// window read from it equal those of the window's own integral HOG, because the gradient
+// of a pixel depends only on its neighbours and every block lies one pixel inside the
+// window's HOG region.
+struct LayerHog {
+    void bind(const LQ::Image& layer, const LQ::BaseRect<int>& region) {
+        mono = &layer;
+        rect = region.intersect(layer.rect());
+        computed = false;
+    }
+    const LQ::Image* mono = nullptr;
+    LQ::BaseRect<int> rect;
+    LQ::Image image;
+    bool computed = false;
+};
+
 class CascadedClassifier : public ClassifierProperties {
 public:
     CascadedClassifier() = default;
@@ -52,6 +69,9 @@ public:
     void writeClassifier(std::ostream& stream, const std::string& prefix) const;
 
     void setName(const std::string& name);
+    // with a shared layer HOG the scan reads from it instead of making one per window;
+    // null goes back to one per window
+    void setLayerHog(LayerHog* layerHog) { layerHog_ = layerHog; }
     const std::vector<StrongClassifier>& stages() const { return strongClassifiers; }
     std::vector<StrongClassifier>& stages() { return strongClassifiers; }
     const LQ::BaseRect<int>& getHogRoi() const { return hogRoi_; }
@@ -71,7 +91,11 @@ private:
     void resetRunTimeState();
     void appendObject(std::vector<AdaObject>& objects, int x, int y, int score) const;
     // the stages from first on, with the integral HOG computed on reaching its first stage
-    bool passesFrom(int first, const unsigned char* r, const unsigned char* m, const unsigned int* i, int& score);
+    bool passesFrom(int first, const unsigned char* r, const unsigned char* m, const unsigned int* i, int x, int y,
+                    int& score);
+    // the first integral HOG sum for the window at (x, y) of the layer whose top-left mono pixel is m
+    const unsigned int* windowHog(const unsigned char* m, int x, int y);
+    void useHogRowLength(int rowLength);
 
     LQ::Image hogImage_;
     bool hogRoiComputed_ = false;
@@ -86,4 +110,7 @@ private:
     // the ring's name shared by every cascade of that name, so hits compare names by pointer
     const char* sharedName_ = "";
     long long hogComputations_ = 0;
+    LayerHog* layerHog_ = nullptr;
+    // row length the HOG offsets are made for at present
+    int hogRowLength_ = 0;
 };

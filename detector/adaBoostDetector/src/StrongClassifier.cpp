@@ -135,3 +135,7 @@ LQ::BaseRect<int> StrongClassifier::calculateHogRoi() const {
 void StrongClassifier::moveHogRoi(const LQ::BaseRect<int>& roi) {
     for (WeakClassifierHog& classifier : hog_) classifier.moveRoi(roi);
 }
+
+void StrongClassifier::setHogRowLength(int rowLength) {
+    for (WeakClassifierHog& classifier : hog_) classifier.setRowLength(rowLength);
+}

@@ -30,6 +30,10 @@ public:
     // the stage's sum for the window whose first RMCT byte, first integral element and
     // integral HOG are given
     int totalScore(const unsigned char* rmct, const LQ::Image& hog, const unsigned int* integral) const {
+        return totalScore(rmct, reinterpret_cast<const unsigned int*>(hog.data()), integral);
+    }
+    // the same with the window's first integral HOG sum given directly
+    int totalScore(const unsigned char* rmct, const unsigned int* hog, const unsigned int* integral) const {
         int s0 = 0, s1 = 0, s2 = 0, s3 = 0;
         const RmctTest* r = packedBegin_;
         // four running sums: the order of integer additions doesn't change the result
@@ -43,10 +47,7 @@ public:
         s0 += s2;
         s1 += s3;
         for (const WeakClassifierHaar* h = haarBegin_; h < haarEnd_; ++h) s1 += h->table[h->index(integral)];
-        if (hogBegin_ != hogEnd_) {
-            const unsigned int* sums = reinterpret_cast<const unsigned int*>(hog.data());
-            for (const WeakClassifierHog* g = hogBegin_; g < hogEnd_; ++g) s0 += g->table[g->index(sums)];
-        }
+        for (const WeakClassifierHog* g = hogBegin_; g < hogEnd_; ++g) s0 += g->table[g->index(hog)];
         return s0 + s1;
     }
 
@@ -55,6 +56,8 @@ public:
     // union of the HOG blocks widened by 1; zero without HOG classifiers
     LQ::BaseRect<int> calculateHogRoi() const;
     void moveHogRoi(const LQ::BaseRect<int>& roi);
+    // HOG offsets for an integral HOG image with rowLength sums per row
+    void setHogRowLength(int rowLength);
 
     // the stage record of a ring file
     void save(std::ostream& stream) const;
