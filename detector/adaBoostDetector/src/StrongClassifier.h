@@ -46,9 +46,11 @@ public:
         for (; r < packedEnd_; ++r) s0 += r->table[rmct[r->offset]];
         s0 += s2;
         s1 += s3;
-        for (const WeakClassifierHaar* h = haarBegin_; h < haarEnd_; ++h) s1 += h->table[h->index(integral)];
-        for (const WeakClassifierHog* g = hogBegin_; g < hogEnd_; ++g) s0 += g->table[g->index(hog)];
-        return s0 + s1;
+        // each kind in its own local sum, so that none of them lives in memory
+        int haar = 0, hogSum = 0;
+        for (const WeakClassifierHaar* h = haarBegin_; h < haarEnd_; ++h) haar += h->table[h->index(integral)];
+        for (const WeakClassifierHog* g = hogBegin_; g < hogEnd_; ++g) hogSum += g->table[g->index(hog)];
+        return s0 + s1 + haar + hogSum;
     }
 
     void rotate(const LQ::BaseSize<int>& size);
