@@ -207,17 +207,33 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
         const unsigned char* rmctRow = rmct.data() + y * rmctStride;
         const unsigned char* monoRow = mono.data() + y * monoStride;
         const unsigned int* integralRow = integral + pShift[y] * integralStride;
-        for (int x = rect.left; x <= rect.right; x += step) {
-            const unsigned char* r = rmctRow + x;
-            int score = 0;
-            if (inlineFirst) {
-                int sum = 0;
-                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[r[t->offset]];
-                if (sum < threshold) continue;
-                score = sum;
+        // the rest of the stages for a window, its first-stage sum in score
+        const auto rest = [&](int x, int score) {
+            if (passesFrom(start, rmctRow + x, monoRow + x, integralRow + pShift[x], x, y, score))
+                appendObject(objects, x, y, score);
+        };
+        int x = rect.left;
+        if (inlineFirst) {
+            // two windows at a time: their look-ups don't wait for each other
+            for (; x + step <= rect.right; x += 2 * step) {
+                const unsigned char* a = rmctRow + x;
+                const unsigned char* b = a + step;
+                int sumA = 0, sumB = 0;
+                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) {
+                    sumA += t->table[a[t->offset]];
+                    sumB += t->table[b[t->offset]];
+                }
+                if (sumA >= threshold) rest(x, sumA);
+                if (sumB >= threshold) rest(x + step, sumB);
             }
-            if (!passesFrom(start, r, monoRow + x, integralRow + pShift[x], x, y, score)) continue;
-            appendObject(objects, x, y, score);
+            for (; x <= rect.right; x += step) {
+                const unsigned char* a = rmctRow + x;
+                int sum = 0;
+                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[a[t->offset]];
+                if (sum >= threshold) rest(x, sum);
+            }
+        } else {
+            for (; x <= rect.right; x += step) rest(x, 0);
         }
     }
 }
