@@ -177,6 +177,8 @@ TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
     }
     // the frame's own object stays unset with this store target
     EXPECT_FALSE(static_cast<const AdaObject&>(state->get<AdaObjectState>()).isSet());
+    // children point back at the frame's aggregator: the frame's reset ends the cycle
+    state->reset();
 }
 
 TEST(AdaBoostDetector, ZoomsFollowTheWidthRange) {
@@ -270,4 +272,5 @@ TEST(AdaBoostDetector, StoreTargetsVerifierAndLostPath) {
     trigger.detect(frame);
     EXPECT_TRUE(trigger.classifierMap().empty());
     EXPECT_EQ(lost->calls, 2);
+    frame->reset();
 }
