@@ -7,6 +7,14 @@
 #include "LQ_Utils.h"
 
 namespace {
+// the last window's integral position must lie inside the integral image
+void checkShift(const int* pShift, const LQ::BaseRect<int>& rect, const LQ::Image& integralImage) {
+    LQ_ASSERT_MSG(pShift[rect.right] < integralImage.width(),
+                  "ShiftX " << pShift[rect.right] << " not compatible with integral image " << integralImage.size());
+    LQ_ASSERT_MSG(pShift[rect.bottom] < integralImage.height(),
+                  "ShiftY " << pShift[rect.bottom] << " not compatible with integral image " << integralImage.size());
+}
+
 // One stable text per distinct name: hits keep a pointer to it and grouping compares
 // names by pointer, so every cascade of a ring must hand out the same one.
 const char* internName(const std::string& name) {
@@ -188,10 +196,7 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
                                           const LQ::Image& integralImage, std::vector<AdaObject>& objects,
                                           const LQ::BaseRect<int>& rect, int bucket, int step) {
     const int* pShift = shiftTables_[bucket].data();
-    LQ_ASSERT_MSG(pShift[rect.right] < integralImage.width(),
-                  "ShiftX " << pShift[rect.right] << " not compatible with integral image " << integralImage.size());
-    LQ_ASSERT_MSG(pShift[rect.bottom] < integralImage.height(),
-                  "ShiftY " << pShift[rect.bottom] << " not compatible with integral image " << integralImage.size());
+    checkShift(pShift, rect, integralImage);
 
     const size_t rmctStride = rmct.stripLength();
     const size_t monoStride = mono.stripLength();
@@ -242,10 +247,7 @@ void CascadedClassifier::addMatchesDynamic(const LQ::Image& rmct, const LQ::Imag
                                            const LQ::Image& integralImage, std::vector<AdaObject>& objects,
                                            const LQ::BaseRect<int>& rect, int bucket, int step) {
     const int* pShift = shiftTables_[bucket].data();
-    LQ_ASSERT_MSG(pShift[rect.right] < integralImage.width(),
-                  "ShiftX " << pShift[rect.right] << " not compatible with integral image " << integralImage.size());
-    LQ_ASSERT_MSG(pShift[rect.bottom] < integralImage.height(),
-                  "ShiftY " << pShift[rect.bottom] << " not compatible with integral image " << integralImage.size());
+    checkShift(pShift, rect, integralImage);
 
     AbsFeature feature(*strongClassifiers.front().activeHaar(), firstThreshold_);
     feature.setStripLength(static_cast<uint16_t>(integralImage.stripLength()));
