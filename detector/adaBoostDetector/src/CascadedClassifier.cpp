@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <set>
+#include <sstream>
 
 #include "LQ_Integral.h"
 #include "LQ_Utils.h"
@@ -47,6 +48,12 @@ CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& othe
 void CascadedClassifier::setName(const std::string& name) {
     ClassifierProperties::setName(name);
     sharedName_ = internName(name);
+}
+
+void CascadedClassifier::setLastStageThreshold(int threshold) {
+    if (strongClassifiers.empty()) return;
+    strongClassifiers.back().setThreshold(threshold);
+    if (strongClassifiers.size() == 1 && firstStage_) firstThreshold_ = threshold;
 }
 
 void CascadedClassifier::resetRunTimeState() {
@@ -285,4 +292,155 @@ bool CascadedClassifier::detect(const unsigned char* rmct, const unsigned char* 
     }
     score = value;
     return true;
+}
+
+namespace {
+constexpr int MAX_STAGES = 10000;
+// words kept free after each cascade record for later fields
+constexpr int RESERVED_WORDS = 1000;
+constexpr int MAX_WINDOW_SIDE = 4096;
+
+bool inside(const LQ::BaseRect<int>& r, const LQ::BaseSize<int>& size) {
+    return r.left >= 0 && r.top >= 0 && r.left <= r.right && r.top <= r.bottom && r.right <= size.width &&
+           r.bottom <= size.height;
+}
+
+// Every feature inside the window: the scan reads no pixel outside a window it places in
+// the image, so a corrupt file can't make it read out of bounds.
+bool featuresInWindow(const std::vector<StrongClassifier>& stages, const LQ::BaseSize<int>& size) {
+    for (const StrongClassifier& stage : stages) {
+        for (const WeakClassifierRmct& c : stage.rmctClassifiers())
+            if (c.point.x < 0 || c.point.y < 0 || c.point.x >= size.width || c.point.y >= size.height) return false;
+        for (const WeakClassifierHaar& c : stage.haarClassifiers())
+            if (!inside(c.allRect, size) || !inside(c.posRect, size)) return false;
+        for (const WeakClassifierHog& c : stage.hogClassifiers())
+            if (!inside(c.block, size) || !inside(c.cell, size) || c.cell.left < c.block.left ||
+                c.cell.top < c.block.top || c.cell.right > c.block.right || c.cell.bottom > c.block.bottom)
+                return false;
+    }
+    return true;
+}
+
+void writeCounts(std::ostream& stream, const char* what, const std::string& prefix,
+                 const std::vector<StrongClassifier>& stages, size_t (*count)(const StrongClassifier&)) {
+    stream << what << prefix << "[" << stages.size() << "] = {";
+    for (const StrongClassifier& stage : stages) stream << count(stage) << ", ";
+    stream << "};\n";
+}
+
+// the four values of a rectangle stored from byte first of row j
+std::string rowRect(const std::string& table, int first) {
+    std::ostringstream text;
+    for (int k = 0; k < 4; ++k) text << (k ? ", " : "") << table << "[j][" << first + k << "]";
+    return text.str();
+}
+}  // namespace
+
+void CascadedClassifier::save(std::ostream& stream) const {
+    stream << monoSize.width << ' ' << monoSize.height << '\n';
+    stream << baseSize_.width << ' ' << baseSize_.height << '\n';
+    stream << (getName().empty() ? "-" : getName()) << '\n';
+    stream << (isSymmetric() ? 1 : 0) << '\n';
+    stream << strongClassifiers.size() << '\n';
+    stream << angle_ << '\n';
+    for (const StrongClassifier& stage : strongClassifiers) stage.save(stream);
+    for (int k = 0; k < RESERVED_WORDS; ++k) stream << 0 << ' ';
+}
+
+bool CascadedClassifier::load(std::istream& stream) {
+    LQ::BaseSize<int> mono, base;
+    std::string name;
+    int symmetric = 0, stageCount = 0, angle = 0;
+    stream >> mono.width >> mono.height >> base.width >> base.height >> name >> symmetric >> stageCount >> angle;
+    stream.get();
+    if (!stream || stageCount < 0 || stageCount > MAX_STAGES) return false;
+    if (mono.width < 1 || mono.height < 1 || mono.width > MAX_WINDOW_SIDE || mono.height > MAX_WINDOW_SIDE ||
+        base.width < 1 || base.height < 1 || base.width > mono.width || base.height > mono.height)
+        return false;
+
+    *this = CascadedClassifier();
+    // the file keeps no centre: the object sits in the middle of the window
+    setMonoSize(mono);
+    setBaseSize(base);
+    setObjectCenter(LQ::BasePoint<int>(mono.width / 2, mono.height / 2));
+    setName(name);
+    setSymmetry(symmetric == 1);
+    setAngle(angle);
+    for (int s = 0; s < stageCount && stream; ++s) {
+        // a stage that can't be read is kept as it stands; the stream's state tells the rest
+        StrongClassifier stage;
+        stage.load(stream);
+        addStrongClassifier(stage);
+    }
+    int reserved = 0;
+    for (int k = 0; k < RESERVED_WORDS && stream; ++k) stream >> reserved;
+    return !stream.fail() && featuresInWindow(strongClassifiers, monoSize);
+}
+
+void CascadedClassifier::writeClassifier(std::ostream& stream, const std::string& prefix) const {
+    const size_t n = strongClassifiers.size();
+    for (size_t i = 0; i < n; ++i) strongClassifiers[i].writeStrongClassifier(stream, prefix + LQ::toStr(i));
+    stream << "\n\n    int set_threshold_" << prefix << "[" << n << "] = {";
+    for (const StrongClassifier& stage : strongClassifiers) stream << stage.getThreshold() << ", ";
+    stream << "};\n";
+    writeCounts(stream, "    short set_weak_classifiers_rmct_n_", prefix, strongClassifiers,
+                [](const StrongClassifier& s) { return s.rmctClassifiers().size(); });
+    writeCounts(stream, "    short set_weak_classifiers_haar_n_", prefix, strongClassifiers,
+                [](const StrongClassifier& s) { return s.haarClassifiers().size(); });
+    writeCounts(stream, "    short set_weak_classifiers_hog_n_", prefix, strongClassifiers,
+                [](const StrongClassifier& s) { return s.hogClassifiers().size(); });
+
+    const std::string c = "    " + prefix + "_cascadedClassifier.";
+    stream << "    static CascadedClassifier " << prefix << "_cascadedClassifier;\n";
+    stream << "    StrongClassifier " << prefix << "_strong_classifier;\n";
+    stream << "    WeakClassifierRmct " << prefix << "_weak_rmct;\n";
+    stream << "    WeakClassifierHaar " << prefix << "_weak_haar;\n";
+    stream << "    WeakClassifierHog " << prefix << "_weak_hog;\n";
+    stream << c << "setMonoSize(LQ::" << monoSize << ");\n";
+    stream << c << "setBaseSize(LQ::" << baseSize_ << ");\n";
+    // only an object away from the middle needs its centre: the others get it from the sizes
+    const LQ::BasePoint<int> middle(monoSize.width / 2, monoSize.height / 2);
+    if (baseSize_ != monoSize || objectCenter_ != middle)
+        stream << c << "setObjectCenter(LQ::" << objectCenter_ << ");\n";
+    stream << c << "setAngle(" << angle_ << ");\n";
+    stream << c << "setName(\"" << prefix << "\");\n";
+    stream << c << "setSymmetry(" << (isSymmetric() ? 1 : 0) << ");\n";
+
+    stream << "        {\n";
+    stream << "        int j;\n";
+    const std::string s = "            " + prefix + "_strong_classifier.";
+    const std::string rmctN = "set_weak_classifiers_rmct_n_" + prefix;
+    const std::string haarN = "set_weak_classifiers_haar_n_" + prefix;
+    const std::string hogN = "set_weak_classifiers_hog_n_" + prefix;
+    for (size_t i = 0; i < n; ++i) {
+        const std::string table = "weak_classifiers_" + prefix + LQ::toStr(i);
+        const std::string at = "[" + LQ::toStr(i) + "]";
+        stream << s << "reset();\n";
+        stream << "        for(j = 0; j < " << rmctN << at << "; j++)\n";
+        stream << "        {\n";
+        stream << "            " << prefix << "_weak_rmct.set(" << table << "[j][0], " << table << "[j][1]);\n";
+        stream << "            " << prefix << "_weak_rmct.setData((LQ::schar*) " << table << "[j] + 2);\n";
+        stream << s << "addRmctClassifier(" << prefix << "_weak_rmct);\n";
+        stream << "        }\n\n";
+        stream << "        for(; j < " << rmctN << at << " + " << haarN << at << "; j++)\n";
+        stream << "        {\n";
+        stream << "            LQ::Rect allRect(" << rowRect(table, 0) << ");\n";
+        stream << "            LQ::Rect posRect(" << rowRect(table, 4) << ");\n";
+        stream << "            " << prefix << "_weak_haar.set(allRect, posRect, " << table << "[j][8]);\n";
+        stream << "            " << prefix << "_weak_haar.setData((LQ::schar*) " << table << "[j] + 8);\n";
+        stream << s << "addHaarClassifier(" << prefix << "_weak_haar);\n";
+        stream << "        }\n\n";
+        stream << "        for(; j < " << rmctN << at << " + " << haarN << at << " + " << hogN << at << "; j++)\n";
+        stream << "        {\n";
+        stream << "            " << prefix << "_weak_hog.setBlock(LQ::Rect(" << rowRect(table, 0) << "));\n";
+        stream << "            " << prefix << "_weak_hog.setCell(LQ::Rect(" << rowRect(table, 4) << "));\n";
+        stream << "            " << prefix << "_weak_hog.setSector(" << table << "[j][8]);\n";
+        stream << "            " << prefix << "_weak_hog.setData((LQ::schar*) " << table << "[j] + 9);\n";
+        stream << s << "addHogClassifier(" << prefix << "_weak_hog);\n";
+        stream << "        }\n\n";
+        stream << s << "setThreshold( set_threshold_" << prefix << at << ");\n";
+        stream << "            " << prefix << "_cascadedClassifier.addStrongClassifier(" << prefix
+               << "_strong_classifier);\n";
+    }
+    stream << "        }\n";
 }

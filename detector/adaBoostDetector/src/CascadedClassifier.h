@@ -69,6 +69,8 @@ public:
     void writeClassifier(std::ostream& stream, const std::string& prefix) const;
 
     void setName(const std::string& name);
+    // also after activation: the scan's copy of the first threshold follows
+    void setLastStageThreshold(int threshold);
     // with a shared layer HOG the scan reads from it instead of making one per window;
     // null goes back to one per window
     void setLayerHog(LayerHog* layerHog) { layerHog_ = layerHog; }

@@ -139,3 +139,54 @@ void StrongClassifier::moveHogRoi(const LQ::BaseRect<int>& roi) {
 void StrongClassifier::setHogRowLength(int rowLength) {
     for (WeakClassifierHog& classifier : hog_) classifier.setRowLength(rowLength);
 }
+
+namespace {
+// more classifiers than this in a stage means a corrupt file
+constexpr int MAX_STAGE_CLASSIFIERS = 10000;
+}  // namespace
+
+void StrongClassifier::save(std::ostream& stream) const {
+    stream << rmct_.size() << ' ' << haar_.size() << ' ' << hog_.size() << '\n';
+    stream << threshold_ << ' ' << 0 << '\n';
+    for (const WeakClassifierHaar& classifier : haar_) classifier.basicSave(stream);
+    for (const WeakClassifierRmct& classifier : rmct_) classifier.basicSave(stream);
+    for (const WeakClassifierHog& classifier : hog_) classifier.basicSave(stream);
+    stream << '\n';
+}
+
+bool StrongClassifier::load(std::istream& stream) {
+    reset();
+    threshold_ = 0;
+    int rmctCount = 0, haarCount = 0, hogCount = 0;
+    stream >> rmctCount >> haarCount >> hogCount;
+    if (!stream || rmctCount < 0 || haarCount < 0 || hogCount < 0 || rmctCount > MAX_STAGE_CLASSIFIERS ||
+        haarCount > MAX_STAGE_CLASSIFIERS || hogCount > MAX_STAGE_CLASSIFIERS)
+        return false;
+    int reserved = 0;
+    stream >> threshold_ >> reserved;
+    // a failed stream reads nothing more, so a truncated file ends the loops at once
+    for (int k = 0; k < haarCount && stream; ++k) {
+        WeakClassifierHaar classifier;
+        classifier.basicLoad(stream);
+        addHaarClassifier(classifier);
+    }
+    for (int k = 0; k < rmctCount && stream; ++k) {
+        WeakClassifierRmct classifier;
+        classifier.basicLoad(stream);
+        addRmctClassifier(classifier);
+    }
+    for (int k = 0; k < hogCount && stream; ++k) {
+        WeakClassifierHog classifier;
+        classifier.basicLoad(stream);
+        addHogClassifier(classifier);
+    }
+    return !stream.fail();
+}
+
+void StrongClassifier::writeStrongClassifier(std::ostream& stream, const std::string& name) const {
+    stream << "\tstatic cData weak_classifiers_" << name << "[" << size() << "][266] = {\n";
+    for (const WeakClassifierRmct& classifier : rmct_) classifier.writeWeakClassifier(stream);
+    for (const WeakClassifierHaar& classifier : haar_) classifier.writeWeakClassifier(stream);
+    for (const WeakClassifierHog& classifier : hog_) classifier.writeWeakClassifier(stream);
+    stream << "};\n";
+}

@@ -142,8 +142,8 @@ void WeakClassifierRmct::writeWeakClassifier(std::ostream& stream) const {
 }
 
 bool WeakClassifierRmct::operator==(const WeakClassifierRmct& other) const {
-    return point.x == other.point.x && point.y == other.point.y && offset == other.offset &&
-           equalTables(table, other.table);
+    // the offset follows from the point and the image stride: it isn't part of the classifier
+    return point.x == other.point.x && point.y == other.point.y && equalTables(table, other.table);
 }
 
 // ---- Haar -----------------------------------------------------------------------

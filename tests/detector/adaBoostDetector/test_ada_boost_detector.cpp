@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "AdaBoostDetector.h"
+#include "ClassifierRing.h"
 #include "LQ_BaseDetector.h"
 #include "LQ_ImageData.h"
 #include "LQ_States.h"
@@ -109,20 +110,17 @@ AdaObject hit(int x, int score) {
 
 }  // namespace
 
-// Four Fs in four poses and three sizes: the detector with all eight variants reports
-// exactly four objects, each with its centre, size, angle and hand.
+// Four Fs in four poses and three sizes: the detector with the eight variants of a ring
+// reports exactly four objects, each with its centre, size, angle and hand. The base
+// cascade is labelled 30 degrees, so the variants carry the ring's derived angles.
 TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
     Tables tables;
-    const CascadedClassifier base = fCascade(tables);
-    std::vector<std::unique_ptr<CascadedClassifier>> variants;
-    for (bool flip : {false, true})
-        for (int turns = 0; turns < 4; ++turns) {
-            variants.emplace_back(new CascadedClassifier(base));
-            if (flip) variants.back()->flipVertically();
-            for (int k = 0; k < turns; ++k) variants.back()->rotate();
-        }
-    std::vector<CascadedClassifier*> cascades;
-    for (auto& c : variants) cascades.push_back(c.get());
+    CascadedClassifier base = fCascade(tables);
+    base.setAngle(30);
+    ClassifierRing ring(std::vector<CascadedClassifier*>{&base});
+    ring.setName("F");
+    const std::vector<CascadedClassifier*> cascades = ring.getClassifiers(LQ::AngleRange(), LQ::Side::BOTH);
+    ASSERT_EQ(cascades.size(), 8u);
 
     Image scene(BaseSize<int>(320, 240), LQ::COLOR_MODE_MONO);
     for (int y = 0; y < 240; ++y)
@@ -134,10 +132,10 @@ TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
         int angle, side;
     };
     const float z2 = 1.2f * 1.2f;
-    const Expected expected[] = {{30, 30, 1.f, {false, 0}, 0, 1},
-                                 {150, 40, z2, {false, 1}, 90, 1},
-                                 {60, 140, 1.2f, {true, 0}, 0, -1},
-                                 {200, 130, z2 * 1.2f, {true, 2}, -180, -1}};
+    const Expected expected[] = {{30, 30, 1.f, {false, 0}, 30, 1},
+                                 {150, 40, z2, {false, 1}, 120, 1},
+                                 {60, 140, 1.2f, {true, 0}, -30, -1},
+                                 {200, 130, z2 * 1.2f, {true, 2}, 150, -1}};
     for (const Expected& e : expected) drawF(scene, e.ox, e.oy, e.scale, e.pose);
 
     SharedPtr<LQ::ImageData> root(new LQ::ImageData());
