@@ -362,3 +362,52 @@ TEST(DeviceOrientation, angleFromAcceleration) {
     getAngleFromAcceleration(9.8f, 0.f, 0.f);
     EXPECT_EQ(getAngleFromAcceleration(0.f, 0.f, 9.8f), 0.f);
 }
+
+// Barycentric weights rebuild the point; transforms by matrix agree with the same
+// transform written out; the iterative pseudo-inverse of a tall matrix is a left inverse.
+TEST(PlaneGeometry, withMatrices) {
+    const LQ::BasePoint<float> triangle[3] = {{0, 0}, {4, 0}, {0, 2}};
+    float w[4];
+    LQ::getBaryCoordsTriangle(LQ::BasePoint<float>(1, 0.5f), triangle, w);
+    EXPECT_NEAR(w[0], 0.5f, 1e-5f);
+    EXPECT_NEAR(w[1], 0.25f, 1e-5f);
+    EXPECT_NEAR(w[2], 0.25f, 1e-5f);
+    const LQ::BasePoint<float> square[4] = {{0, 0}, {2, 0}, {2, 2}, {0, 2}};
+    const LQ::BasePoint<float> p(0.5f, 1.5f);
+    LQ::getBaryCoordsQuad(p, square, w);
+    LQ::BasePoint<float> rebuilt(0, 0);
+    float sum = 0;
+    for (int i = 0; i < 4; ++i) {
+        rebuilt += square[i] * w[i];
+        sum += w[i];
+    }
+    EXPECT_NEAR(sum, 1.f, 1e-5f);
+    EXPECT_NEAR(rebuilt.x, p.x, 1e-4f);
+    EXPECT_NEAR(rebuilt.y, p.y, 1e-4f);
+
+    const float h[9] = {2, 0, 3, 0, 1, -1, 0.5f, 0, 1};
+    const LQ::Matrix homography(LQ::Size(3, 3), h);
+    const LQ::BasePoint<float> q = LQ::applyHomography(LQ::BasePoint<float>(2, 4), homography);
+    EXPECT_FLOAT_EQ(q.x, 3.5f);  // (4 + 3) / 2
+    EXPECT_FLOAT_EQ(q.y, 1.5f);  // (4 - 1) / 2
+    // the same transform for coordinates twice as large maps 2p to 2q
+    const LQ::BasePoint<float> q2 =
+        LQ::applyHomography(LQ::BasePoint<float>(4, 8), LQ::scaleTransformArgument(2, homography));
+    EXPECT_FLOAT_EQ(q2.x, 7.f);
+    EXPECT_FLOAT_EQ(q2.y, 3.f);
+
+    const float a[6] = {0, -1, 10, 1, 0, 20};
+    const LQ::Matrix affine(LQ::Size(3, 2), a);
+    EXPECT_EQ(LQ::applyAffineTransformation(LQ::BasePoint<float>(1, 2), affine), LQ::BasePoint<float>(8, 21));
+    EXPECT_EQ(LQ::applyAffineTransformationToVec(LQ::BasePoint<float>(1, 2), affine), LQ::BasePoint<float>(-2, 1));
+    const FailedCheck wrong = catchCheck([&] { LQ::applyHomography(LQ::BasePoint<float>(), affine); });
+    EXPECT_EQ(wrong.expression, "matrix.size() == Size(3, 3)");
+    const FailedCheck empty = catchCheck([] { LQ::scaleTransformArgument(2, LQ::Matrix()); });
+    EXPECT_EQ(empty.expression, "!_transform.isEmpty()");
+
+    const float t[6] = {1, 2, 3, 4, 5, 7};
+    const LQ::Matrix tall(LQ::Size(2, 3), t);
+    const LQ::Matrix identity = LQ::pseudoInverseIterative(tall) * tall;
+    for (int r = 0; r < 2; ++r)
+        for (int c = 0; c < 2; ++c) EXPECT_NEAR(identity(r, c), r == c ? 1.f : 0.f, 1e-3f) << r << c;
+}

@@ -5,6 +5,7 @@
 #include <cmath>
 
 #include "LQ_History.h"
+#include "LQ_Utils.h"
 
 namespace LQ {
 
@@ -270,6 +271,72 @@ float getAngleFromAcceleration(float x, float y, float z) {
     const float angle = std::atan2(y, x);
     history.add(angle);
     return angle;
+}
+
+// ---- with matrices ----------------------------------------------------------
+
+void getBaryCoordsN(int n, const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights) {
+    const BasePoint<float>& last = vertices[n - 1];
+    // the other vertices relative to the last, as the columns of a 2 x (n - 1) matrix
+    Matrix relative(Size(n - 1, 2));
+    for (int i = 0; i < n - 1; ++i) {
+        relative(0, i) = vertices[i].x - last.x;
+        relative(1, i) = vertices[i].y - last.y;
+    }
+    Matrix normal;
+    Matrix::XXT(relative, normal);
+    const Matrix solution = relative.transpose() * (Matrix::pseudoInverse2x2(normal) * Matrix(point - last));
+    float sum = 0;
+    for (int i = 0; i < n - 1; ++i) {
+        weights[i] = solution[i];
+        sum += solution[i];
+    }
+    weights[n - 1] = 1.f - sum;
+}
+
+void getBaryCoordsTriangle(const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights) {
+    getBaryCoordsN(3, point, vertices, weights);
+}
+
+void getBaryCoordsQuad(const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights) {
+    getBaryCoordsN(4, point, vertices, weights);
+}
+
+BasePoint<float> applyHomography(const BasePoint<float>& point, const Matrix& matrix) {
+    LQ_ASSERT(matrix.size() == Size(3, 3));
+    const float w = matrix[6] * point.x + matrix[7] * point.y + matrix[8];
+    return BasePoint<float>((matrix[0] * point.x + matrix[1] * point.y + matrix[2]) / w,
+                            (matrix[3] * point.x + matrix[4] * point.y + matrix[5]) / w);
+}
+
+BasePoint<float> applyAffineTransformation(const BasePoint<float>& point, const Matrix& matrix) {
+    LQ_ASSERT(matrix.size() == Size(3, 2) || matrix.size() == Size(3, 3));
+    return BasePoint<float>(matrix[0] * point.x + matrix[1] * point.y + matrix[2],
+                            matrix[3] * point.x + matrix[4] * point.y + matrix[5]);
+}
+
+BasePoint<float> applyAffineTransformationToVec(const BasePoint<float>& vector, const Matrix& matrix) {
+    LQ_ASSERT(matrix.size() == Size(3, 2) || matrix.size() == Size(3, 3));
+    return BasePoint<float>(matrix[0] * vector.x + matrix[1] * vector.y, matrix[3] * vector.x + matrix[4] * vector.y);
+}
+
+Matrix scaleTransformArgument(float scale, const Matrix& _transform) {
+    LQ_ASSERT(!_transform.isEmpty());
+    Matrix result(_transform);
+    result[2] *= scale;
+    result[5] *= scale;
+    result[6] /= scale;
+    result[7] /= scale;
+    return result;
+}
+
+Matrix pseudoInverseIterative(const Matrix& matrix) {
+    Matrix normal;
+    Matrix::XTX(matrix, normal);
+    for (int i = 0; i < normal.size().width; ++i) normal(i, i) += 0.01f;
+    Matrix x = normal.invert() * matrix.transpose();
+    for (int step = 0; step < 2; ++step) x = 2.f * x - x * matrix * x;
+    return x;
 }
 
 }  // namespace LQ

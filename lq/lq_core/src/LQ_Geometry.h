@@ -8,6 +8,7 @@
 
 #include <vector>
 
+#include "LQ_Matrix.h"
 #include "LQ_Point.h"
 #include "LQ_Rect.h"
 
@@ -104,6 +105,27 @@ bool intersectLinePlane(const BasePoint3d<float>& linePoint, const BasePoint3d<f
 BasePoint3d<float> selectNearestPointInDirection(const BasePoint3d<float>& first,
                                                  const BasePoint3d<float>& second,
                                                  const BasePoint3d<float>& direction);
+
+// ---- with matrices ----------------------------------------------------------
+
+// Generalised barycentric coordinates of point in the polygon of n vertices: the
+// least-squares (smallest) weights of the vertices relative to the last one, which gets
+// 1 minus the sum of the others. Exact for a triangle that isn't degenerate.
+void getBaryCoordsN(int n, const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights);
+void getBaryCoordsTriangle(const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights);
+void getBaryCoordsQuad(const BasePoint<float>& point, const BasePoint<float>* vertices, float* weights);
+
+// point through a 3 x 3 projective transform
+BasePoint<float> applyHomography(const BasePoint<float>& point, const Matrix& matrix);
+// point through an affine transform, 3 wide and 2 or 3 high; the vector form leaves out
+// the translation
+BasePoint<float> applyAffineTransformation(const BasePoint<float>& point, const Matrix& matrix);
+BasePoint<float> applyAffineTransformationToVec(const BasePoint<float>& vector, const Matrix& matrix);
+// the same 3 x 3 transform for coordinates multiplied by scale
+Matrix scaleTransformArgument(float scale, const Matrix& _transform);
+// Moore-Penrose inverse of any matrix: a regularised normal solution refined by two
+// Newton steps
+Matrix pseudoInverseIterative(const Matrix& matrix);
 
 // ---- device orientation -----------------------------------------------------
 

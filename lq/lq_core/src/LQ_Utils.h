@@ -19,6 +19,7 @@ namespace LQ {
 
 typedef unsigned char uchar;
 typedef signed char schar;
+typedef unsigned int uint;
 
 enum LogLevel { LOG_LEVEL_DEBUG = 0, LOG_LEVEL_INFO = 1, LOG_LEVEL_WARNING = 2, LOG_LEVEL_FATAL = 4 };
 
@@ -137,7 +138,10 @@ inline char typeChar<double>() { return 'D'; }
     do {                                                                                      \
         const auto& lq_check_a_ = (a);                                                        \
         const auto& lq_check_b_ = (b);                                                        \
-        if (!(lq_check_a_ op lq_check_b_)) {                                                  \
+        /* a size against a literal: the mixed signedness is meant */                         \
+        _Pragma("GCC diagnostic push") _Pragma("GCC diagnostic ignored \"-Wsign-compare\"")   \
+        const bool lq_check_ok_ = lq_check_a_ op lq_check_b_;                                 \
+        _Pragma("GCC diagnostic pop") if (!lq_check_ok_) {                                    \
             std::ostringstream lq_check_stream_;                                              \
             lq_check_stream_ << lq_check_a_ << opposite << lq_check_b_;                       \
             ::LQ::failAssertion("(" #a ") " #op " (" #b ")", __FILE__, __LINE__, __func__,    \
