@@ -1,0 +1,244 @@
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <fstream>
+#include <random>
+#include <sstream>
+
+#include "ConvolutionLayer.h"
+#include "DataLayer.h"
+#include "LogCapture.h"
+#include "NnDetector.h"
+#include "PReluLayer.h"
+
+#if defined(TACTUS_WITH_OPENCV_DNN)
+#include <opencv2/dnn.hpp>
+#endif
+
+namespace {
+
+struct Conv {
+    const char* name;
+    int outputs, inputs, height, width, stride, pad;
+};
+
+// The two palm verifier shapes: every convolution but the last followed by a PReLU.
+const std::vector<Conv> kPalm35x33 = {{"conv1", 10, 1, 3, 3, 2, 0},  {"conv2", 10, 10, 3, 3, 1, 0},
+                                      {"conv3", 10, 10, 3, 3, 1, 0}, {"conv4", 10, 10, 3, 3, 1, 0},
+                                      {"conv5", 10, 10, 3, 3, 1, 0}, {"conv6", 10, 10, 3, 3, 1, 0},
+                                      {"conv7", 10, 10, 3, 3, 1, 0}, {"conv8", 10, 10, 3, 3, 1, 0},
+                                      {"conv9", 30, 10, 2, 3, 1, 0}, {"final", 2, 30, 1, 1, 1, 0}};
+const std::vector<Conv> kPalm50x60 = {
+    {"conv1", 10, 1, 3, 3, 2, 0},  {"conv2", 10, 10, 3, 3, 1, 0},  {"conv3", 10, 10, 3, 3, 1, 0},
+    {"conv4", 10, 10, 3, 3, 1, 0}, {"conv5", 10, 10, 3, 3, 2, 0},  {"conv6", 10, 10, 3, 3, 1, 0},
+    {"conv7", 10, 10, 3, 3, 1, 0}, {"conv8", 10, 10, 3, 3, 1, 0},  {"conv81", 10, 10, 3, 3, 1, 1},
+    {"conv82", 10, 10, 3, 3, 1, 1}, {"conv83", 10, 10, 3, 3, 1, 1}, {"conv84", 10, 10, 3, 3, 1, 1},
+    {"conv9", 30, 10, 5, 2, 1, 0}, {"final", 2, 30, 1, 1, 1, 0}};
+
+Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale) {
+    Blob blob(n, c, h, w);
+    std::uniform_real_distribution<float> value(-scale, scale);
+    for (int i = 0; i < blob.size(); ++i) blob.data()[i] = value(random);
+    return blob;
+}
+
+NnDetector palmNetwork(const std::string& name, const std::vector<Conv>& shape, LQ::BaseSize<int> size,
+                       unsigned int seed) {
+    std::mt19937 random(seed);
+    NnDetector net;
+    net.setName(name);
+    LQ::SharedPtr<BaseLayer> previous(new DataLayer("data"));
+    net.addLayer(previous);
+    int relu = 0;
+    for (const Conv& c : shape) {
+        const float scale = 1.5f / std::sqrt(static_cast<float>(c.inputs * c.height * c.width));
+        LQ::SharedPtr<BaseLayer> conv(new ConvolutionLayer(randomBlob(random, c.outputs, c.inputs, c.height, c.width, scale),
+                                                           randomBlob(random, c.outputs, 1, 1, 1, 0.1f), c.name,
+                                                           c.stride, c.pad));
+        conv->addBottomLayer(previous);
+        net.addLayer(conv);
+        previous = conv;
+        if (std::string(c.name) == "final") break;
+        LQ::SharedPtr<BaseLayer> prelu(
+            new PReluLayer("PReLU" + std::to_string(++relu), randomBlob(random, c.outputs, 1, 1, 1, 0.5f)));
+        prelu->addBottomLayer(previous);
+        net.addLayer(prelu);
+        previous = prelu;
+    }
+    net.setSize(size);
+    return net;
+}
+
+LQ::Image randomImage(std::mt19937& random, LQ::BaseSize<int> size) {
+    LQ::Image image(size, LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < size.height; ++y)
+        for (int x = 0; x < size.width; ++x) image.pixel(x, y)[0] = static_cast<unsigned char>(random() % 256);
+    return image;
+}
+
+std::string bytesOf(const NnDetector& net) {
+    std::ostringstream stream;
+    LQ::ArchiveO archive(stream);
+    archive & net;
+    return stream.str();
+}
+
+NnDetector fromBytes(const std::string& bytes) {
+    std::istringstream stream(bytes);
+    LQ::ArchiveI archive(stream);
+    NnDetector net;
+    archive & net;
+    return net;
+}
+
+}  // namespace
+
+// The shapes run through to two class scores, with the sizes each layer should give.
+TEST(PalmNetworks, ShapesAndOutputs) {
+    NnDetector small = palmNetwork("palm_verifier__iter_250000", kPalm35x33, LQ::BaseSize<int>(35, 33), 1);
+    std::mt19937 random(2);
+    const Blob& out = small.detect(randomImage(random, LQ::BaseSize<int>(35, 33)));
+    EXPECT_EQ(out.shape(), "1 x 2 x 1 x 1");
+    EXPECT_EQ(small.getNetwork()[1]->getBlob().shape(), "1 x 10 x 17 x 16");
+    EXPECT_EQ(small.getNetwork()[15]->getBlob().shape(), "1 x 10 x 3 x 2");
+    EXPECT_EQ(small.getOutputNames(), std::vector<std::string>{"final"});
+
+    NnDetector large = palmNetwork("palm_verifier_iter_140000", kPalm50x60, LQ::BaseSize<int>(50, 60), 3);
+    EXPECT_EQ(large.detect(randomImage(random, LQ::BaseSize<int>(50, 60))).shape(), "1 x 2 x 1 x 1");
+    EXPECT_EQ(large.getNetwork()[9]->getBlob().shape(), "1 x 10 x 8 x 11");
+    EXPECT_EQ(large.getNetwork()[23]->getBlob().shape(), "1 x 10 x 2 x 5");
+}
+
+// Written and read again, through memory and through a file, a network is equal and
+// gives the same bits.
+TEST(PalmNetworks, ModelFileRoundTrip) {
+    NnDetector net = palmNetwork("palm_verifier_iter_140000", kPalm50x60, LQ::BaseSize<int>(50, 60), 5);
+    std::mt19937 random(6);
+    const LQ::Image image = randomImage(random, LQ::BaseSize<int>(50, 60));
+    const std::vector<float> expected = net.detect(image);
+
+    NnDetector read = fromBytes(bytesOf(net));
+    EXPECT_TRUE(read == net);
+    EXPECT_EQ(read.getName(), "palm_verifier_iter_140000");
+    EXPECT_EQ(static_cast<std::vector<float>>(read.detect(image)), expected);
+    EXPECT_EQ(read.getOutputNames(), std::vector<std::string>{"final"});
+
+    const std::string path = ::testing::TempDir() + "tactus_palm_" + std::to_string(getpid()) + ".nn";
+    std::ofstream(path, std::ios::binary) << bytesOf(net);
+    NnDetector loaded;
+    LQ::ArchiveI::load(path, loaded);
+    std::remove(path.c_str());
+    EXPECT_TRUE(loaded == net);
+    EXPECT_EQ(catchCheck([&] { LQ::ArchiveI::load(path, loaded); }).tail, "cannot open " + path);
+}
+
+// A file of the first format: no stride, pad or colour mode; the reader fills in 1, 0
+// and mono.
+TEST(PalmNetworks, OldestFormatLoads) {
+    std::mt19937 random(9);
+    const Blob filter = randomBlob(random, 2, 1, 3, 3, 1.f), bias = randomBlob(random, 2, 1, 1, 1, 1.f);
+    std::ostringstream stream;
+    LQ::ArchiveO out(stream);
+    out.setVersion("Version 1");
+    out & std::string("Version 1") & "\n" & std::string("old") & "\n" & LQ::BaseSize<int>(5, 4) & "\n";
+    out & static_cast<uint32_t>(2) & "\n";
+    out & std::string("DataLayer") & std::string("data") & static_cast<uint32_t>(0) & "\n";
+    out & std::string("ConvolutionLayer") & std::string("conv") & filter & bias & static_cast<int32_t>(9);
+    out & static_cast<uint32_t>(1) & std::string("data") & "\n";
+    NnDetector old = fromBytes(stream.str());
+    EXPECT_EQ(old.getInputColorMode(), LQ::COLOR_MODE_MONO);
+    const ConvolutionLayer& conv = static_cast<const ConvolutionLayer&>(*old.getNetwork()[1]);
+    EXPECT_TRUE(conv == ConvolutionLayer(filter, bias, "conv", 1, 0));
+    std::mt19937 pixels(10);
+    EXPECT_EQ(old.detect(randomImage(pixels, LQ::BaseSize<int>(5, 4))).shape(), "1 x 2 x 3 x 2");
+}
+
+// Broken files end in a failed check with a clear text: never a crash or a huge allocation.
+TEST(PalmNetworks, BadFilesFailCleanly) {
+    const std::string good = bytesOf(palmNetwork("palm", kPalm35x33, LQ::BaseSize<int>(35, 33), 4));
+    for (size_t cut = 1; cut < good.size(); cut += good.size() / 40 + 1)
+        EXPECT_TRUE(catchCheck([&] { fromBytes(good.substr(0, cut)); }).thrown) << cut;
+
+    std::string newer = good;
+    newer.replace(0, 9, "Version 9");
+    const FailedCheck version = catchCheck([&] { fromBytes(newer); });
+    EXPECT_EQ(version.expression, "version <= NN_CLASSIFIER_VERSION");
+    EXPECT_EQ(version.tail, "Wrong version number Version 9");
+
+    std::string mark = good;
+    mark[10] = 'x';  // the mark after the version
+    EXPECT_TRUE(catchCheck([&] { fromBytes(mark); }).thrown);
+
+    std::string unknown = good;
+    const size_t type = unknown.find("ConvolutionLayer");
+    unknown.replace(type, 16, "ConvolutionLayex");
+    EXPECT_EQ(catchCheck([&] { fromBytes(unknown); }).tail, "Unknown type: ConvolutionLayex");
+
+    // the first filter's shape: huge, then negative
+    const size_t shape = good.find("conv1") + 6;
+    for (int32_t value : {1 << 28, -10}) {
+        std::string bad = good;
+        std::memcpy(&bad[shape], &value, 4);
+        EXPECT_TRUE(catchCheck([&] { fromBytes(bad); }).thrown) << value;
+    }
+}
+
+#if defined(TACTUS_WITH_OPENCV_DNN)
+namespace {
+cv::Mat toMat(const Blob& blob, std::vector<int> shape) { return cv::Mat(shape, CV_32F, const_cast<float*>(blob.data())).clone(); }
+
+// The same network in OpenCV's dnn module, layer by layer from our weights.
+cv::dnn::Net openCvNetwork(const NnDetector& net) {
+    cv::dnn::Net result;
+    for (const LQ::SharedPtr<BaseLayer>& layer : net.getNetwork()) {
+        cv::dnn::LayerParams params;
+        params.name = layer->name();
+        if (layer->type() == "ConvolutionLayer") {
+            const ConvolutionLayer& conv = static_cast<const ConvolutionLayer&>(*layer);
+            const Blob& f = conv.getFilter();
+            params.type = "Convolution";
+            params.set("kernel_h", f.height());
+            params.set("kernel_w", f.width());
+            params.set("stride", conv.getStride());
+            params.set("pad", conv.getPad());
+            params.set("num_output", f.num());
+            params.set("bias_term", true);
+            params.blobs.push_back(toMat(f, {f.num(), f.channels(), f.height(), f.width()}));
+            params.blobs.push_back(toMat(conv.getBias(), {1, conv.getBias().size()}));
+        } else if (layer->type() == "PReluLayer") {
+            params.type = "PReLU";
+            const Blob& slope = static_cast<const PReluLayer&>(*layer).getSlope();
+            params.blobs.push_back(toMat(slope, {1, slope.size()}));
+        } else {
+            continue;
+        }
+        result.addLayerToPrev(params.name, params.type, params);
+    }
+    return result;
+}
+}  // namespace
+
+// Both palm shapes against OpenCV's dnn module running the same weights on the same input.
+TEST(PalmNetworks, AgreeWithOpenCvDnn) {
+    for (int which = 0; which < 2; ++which) {
+        const LQ::BaseSize<int> size = which ? LQ::BaseSize<int>(50, 60) : LQ::BaseSize<int>(35, 33);
+        NnDetector net = palmNetwork("palm", which ? kPalm50x60 : kPalm35x33, size, 20 + which);
+        cv::dnn::Net reference = openCvNetwork(net);
+        std::mt19937 random(30 + which);
+        for (int trial = 0; trial < 3; ++trial) {
+            const LQ::Image image = randomImage(random, size);
+            Blob input;
+            net.convert(image, input, 0, 1);
+            reference.setInput(toMat(input, {1, 1, size.height, size.width}));
+            const cv::Mat expected = reference.forward();
+            const std::vector<float> ours = net.detect(image);
+            ASSERT_EQ(expected.total(), ours.size());
+            for (size_t k = 0; k < ours.size(); ++k)
+                EXPECT_NEAR(ours[k], expected.ptr<float>()[k], 1e-4f * (1 + std::fabs(ours[k]))) << which << k;
+        }
+    }
+}
+#else
+TEST(PalmNetworks, AgreeWithOpenCvDnn) { GTEST_SKIP() << "OpenCV's dnn module (libopencv-dnn-dev) is not installed"; }
+#endif
