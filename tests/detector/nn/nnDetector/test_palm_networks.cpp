@@ -11,63 +11,19 @@
 #include "LogCapture.h"
 #include "NnDetector.h"
 #include "PReluLayer.h"
+#include "PalmNetworks.h"
 
 #if defined(TACTUS_WITH_OPENCV_DNN)
-#include <opencv2/dnn.hpp>
+#include "OpenCvNetwork.h"
 #endif
 
 namespace {
-
-struct Conv {
-    const char* name;
-    int outputs, inputs, height, width, stride, pad;
-};
-
-// The two palm verifier shapes: every convolution but the last followed by a PReLU.
-const std::vector<Conv> kPalm35x33 = {{"conv1", 10, 1, 3, 3, 2, 0},  {"conv2", 10, 10, 3, 3, 1, 0},
-                                      {"conv3", 10, 10, 3, 3, 1, 0}, {"conv4", 10, 10, 3, 3, 1, 0},
-                                      {"conv5", 10, 10, 3, 3, 1, 0}, {"conv6", 10, 10, 3, 3, 1, 0},
-                                      {"conv7", 10, 10, 3, 3, 1, 0}, {"conv8", 10, 10, 3, 3, 1, 0},
-                                      {"conv9", 30, 10, 2, 3, 1, 0}, {"final", 2, 30, 1, 1, 1, 0}};
-const std::vector<Conv> kPalm50x60 = {
-    {"conv1", 10, 1, 3, 3, 2, 0},  {"conv2", 10, 10, 3, 3, 1, 0},  {"conv3", 10, 10, 3, 3, 1, 0},
-    {"conv4", 10, 10, 3, 3, 1, 0}, {"conv5", 10, 10, 3, 3, 2, 0},  {"conv6", 10, 10, 3, 3, 1, 0},
-    {"conv7", 10, 10, 3, 3, 1, 0}, {"conv8", 10, 10, 3, 3, 1, 0},  {"conv81", 10, 10, 3, 3, 1, 1},
-    {"conv82", 10, 10, 3, 3, 1, 1}, {"conv83", 10, 10, 3, 3, 1, 1}, {"conv84", 10, 10, 3, 3, 1, 1},
-    {"conv9", 30, 10, 5, 2, 1, 0}, {"final", 2, 30, 1, 1, 1, 0}};
 
 Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale) {
     Blob blob(n, c, h, w);
     std::uniform_real_distribution<float> value(-scale, scale);
     for (int i = 0; i < blob.size(); ++i) blob.data()[i] = value(random);
     return blob;
-}
-
-NnDetector palmNetwork(const std::string& name, const std::vector<Conv>& shape, LQ::BaseSize<int> size,
-                       unsigned int seed) {
-    std::mt19937 random(seed);
-    NnDetector net;
-    net.setName(name);
-    LQ::SharedPtr<BaseLayer> previous(new DataLayer("data"));
-    net.addLayer(previous);
-    int relu = 0;
-    for (const Conv& c : shape) {
-        const float scale = 1.5f / std::sqrt(static_cast<float>(c.inputs * c.height * c.width));
-        LQ::SharedPtr<BaseLayer> conv(new ConvolutionLayer(randomBlob(random, c.outputs, c.inputs, c.height, c.width, scale),
-                                                           randomBlob(random, c.outputs, 1, 1, 1, 0.1f), c.name,
-                                                           c.stride, c.pad));
-        conv->addBottomLayer(previous);
-        net.addLayer(conv);
-        previous = conv;
-        if (std::string(c.name) == "final") break;
-        LQ::SharedPtr<BaseLayer> prelu(
-            new PReluLayer("PReLU" + std::to_string(++relu), randomBlob(random, c.outputs, 1, 1, 1, 0.5f)));
-        prelu->addBottomLayer(previous);
-        net.addLayer(prelu);
-        previous = prelu;
-    }
-    net.setSize(size);
-    return net;
 }
 
 LQ::Image randomImage(std::mt19937& random, LQ::BaseSize<int> size) {
@@ -185,40 +141,6 @@ TEST(PalmNetworks, BadFilesFailCleanly) {
 }
 
 #if defined(TACTUS_WITH_OPENCV_DNN)
-namespace {
-cv::Mat toMat(const Blob& blob, std::vector<int> shape) { return cv::Mat(shape, CV_32F, const_cast<float*>(blob.data())).clone(); }
-
-// The same network in OpenCV's dnn module, layer by layer from our weights.
-cv::dnn::Net openCvNetwork(const NnDetector& net) {
-    cv::dnn::Net result;
-    for (const LQ::SharedPtr<BaseLayer>& layer : net.getNetwork()) {
-        cv::dnn::LayerParams params;
-        params.name = layer->name();
-        if (layer->type() == "ConvolutionLayer") {
-            const ConvolutionLayer& conv = static_cast<const ConvolutionLayer&>(*layer);
-            const Blob& f = conv.getFilter();
-            params.type = "Convolution";
-            params.set("kernel_h", f.height());
-            params.set("kernel_w", f.width());
-            params.set("stride", conv.getStride());
-            params.set("pad", conv.getPad());
-            params.set("num_output", f.num());
-            params.set("bias_term", true);
-            params.blobs.push_back(toMat(f, {f.num(), f.channels(), f.height(), f.width()}));
-            params.blobs.push_back(toMat(conv.getBias(), {1, conv.getBias().size()}));
-        } else if (layer->type() == "PReluLayer") {
-            params.type = "PReLU";
-            const Blob& slope = static_cast<const PReluLayer&>(*layer).getSlope();
-            params.blobs.push_back(toMat(slope, {1, slope.size()}));
-        } else {
-            continue;
-        }
-        result.addLayerToPrev(params.name, params.type, params);
-    }
-    return result;
-}
-}  // namespace
-
 // Both palm shapes against OpenCV's dnn module running the same weights on the same input.
 TEST(PalmNetworks, AgreeWithOpenCvDnn) {
     for (int which = 0; which < 2; ++which) {
@@ -230,7 +152,7 @@ TEST(PalmNetworks, AgreeWithOpenCvDnn) {
             const LQ::Image image = randomImage(random, size);
             Blob input;
             net.convert(image, input, 0, 1);
-            reference.setInput(toMat(input, {1, 1, size.height, size.width}));
+            reference.setInput(blobToMat(input, {1, 1, size.height, size.width}));
             const cv::Mat expected = reference.forward();
             const std::vector<float> ours = net.detect(image);
             ASSERT_EQ(expected.total(), ours.size());

@@ -1,0 +1,22 @@
+#pragma once
+// The two palm verifier shapes, built with random weights from a seed: the tests compare
+// them with other runtimes and the benchmarks time them; the trainer fills them in.
+
+#include <string>
+#include <vector>
+
+#include "NnDetector.h"
+
+struct ConvShape {
+    const char* name;
+    int outputs, inputs, height, width, stride, pad;
+};
+
+// every convolution but "final" is followed by a PReLU
+extern const std::vector<ConvShape> kPalm35x33;
+extern const std::vector<ConvShape> kPalm50x60;
+
+// a chain of the given convolutions after a data layer, weights uniform and scaled to
+// the filter volume
+NnDetector palmNetwork(const std::string& name, const std::vector<ConvShape>& shape, LQ::BaseSize<int> size,
+                       unsigned int seed);
