@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <fstream>
 #include <map>
 #include <sstream>
 
@@ -258,4 +259,83 @@ LQ::ArchiveO& operator&(LQ::ArchiveO& archive, const NnDetector& detector) {
         archive & "\n";
     }
     return archive;
+}
+
+bool NnDetector::saveToCpp(const std::string& fileName) {
+    std::ofstream file(fileName.c_str(), std::ios::binary | std::ios::trunc);
+    LQ_ASSERT_MSG(file, "cannot open file " << fileName);
+    const size_t slash = fileName.find_last_of('/');
+    std::string base = slash == std::string::npos ? fileName : fileName.substr(slash + 1);
+    const size_t dot = base.rfind('.');
+    if (dot != std::string::npos) base.erase(dot);
+    saveToCpp(file, base);
+    file.flush();
+    return static_cast<bool>(file);
+}
+
+void NnDetector::saveToCpp(std::ostream& stream, const std::string& name) {
+    const std::string& N = name;
+    stream << "/**\n"
+           << " * @file " << N << ".cpp\n"
+           << " * @brief The network " << name_ << " as constant tables, written by NnDetector::saveToCpp.\n"
+           << " * Do not edit; write it again from the network.\n"
+           << " */\n";
+    stream << "#include \"NNDetector.h\"\n";
+    stream << "#ifdef __cplusplus\n"
+           << "extern \"C\"\n"
+           << "{\n"
+           << "#endif //__cplusplus\n";
+    stream << "// For exporting from a Windows DLL:\n"
+           << "#ifdef WIN32\n"
+           << "#   define DLL_DECLSPEC __declspec(dllexport)\n"
+           << "#else\n"
+           << "#   define DLL_DECLSPEC __attribute__ ((visibility (\"default\")))\n"
+           << "#endif //WIN32\n";
+    stream << "    DLL_DECLSPEC void " << N << "(NNDetector& detector);\n";
+    stream << "#ifdef __cplusplus\n"
+           << "}\n"
+           << "#endif //__cplusplus\n\n";
+    stream << "namespace " << N << "NameSpace" << "\n"
+           << "{\n"
+           << "\n";
+    for (const LQ::SharedPtr<BaseLayer>& layer : network_) layer->saveToCpp(stream, fixName(layer->name()));
+    stream << "NNDetector& " << N << "()\n"
+           << "{\n"
+           << "    static NNDetector nnDetector;\n\n"
+           << "    if (nnDetector.isLoaded())\n"
+           << "    {\n"
+           << "        return nnDetector;\n"
+           << "    }\n\n"
+           << "    nnDetector.setName(\"" << N << "\");\n\n"
+           << "    std::vector<float> meanValues;\n";
+    for (float value : meanValues_) stream << "    meanValues.push_back(" << value << ");\n";
+    stream << "    nnDetector.setMeanValues(meanValues);\n\n";
+    for (size_t i = 0; i < network_.size(); ++i) {
+        const std::string L = fixName(network_[i]->name());
+        stream << "    // set layer #" << i << ":\n"
+               << "    LQ::SharedPtr<BaseLayer> p_" << L << "(&" << L << "(), false);\n"
+               << "    nnDetector.addLayer(p_" << L << ");\n";
+        const std::vector<std::string> bottoms = network_[i]->getBottomLayersName();
+        for (const std::string& bottom : bottoms) stream << "    p_" << L << "->addBottomLayer(p_" << fixName(bottom) << ");\n";
+        if (!bottoms.empty()) stream << "\n";
+    }
+    stream << "    nnDetector.setSize(LQ::" << size_ << ");\n\n"
+           << "    return nnDetector;\n"
+           << "}\n"
+           << "\n";
+    stream << "} //" << N << "NameSpace" << "\n"
+           << "\n";
+    stream << "void " << N << "(NNDetector& nnDetector)\n"
+           << "{\n"
+           << "    nnDetector = " << N << "NameSpace::" << N << "();\n"
+           << "}\n"
+           << "\n";
+    stream << "LQ::SharedPtr<NNDetector> " << N << "()\n"
+           << "{\n"
+           << "    return LQ::SharedPtr<NNDetector>(&" << N << "NameSpace::" << N << "(), false);\n"
+           << "}\n"
+           << "\n";
+    std::istringstream log(trainLog_);
+    std::string line;
+    while (std::getline(log, line)) stream << "// " << line << "\n";
 }

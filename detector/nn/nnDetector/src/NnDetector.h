@@ -2,6 +2,7 @@
 // A whole network as one value: its layers in execution order, the input size, how an
 // image becomes the input blob, and which layers are the outputs.
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -64,6 +65,10 @@ public:
     LQ::SharedPtr<NnDetector> clone() const;
 
     bool operator==(const NnDetector& other) const;
+
+    // the generated source form: a unit that builds this network from constant tables
+    bool saveToCpp(const std::string& fileName);
+    void saveToCpp(std::ostream& stream, const std::string& name);
 
     friend LQ::ArchiveI& operator&(LQ::ArchiveI& archive, NnDetector& detector);
     friend LQ::ArchiveO& operator&(LQ::ArchiveO& archive, const NnDetector& detector);

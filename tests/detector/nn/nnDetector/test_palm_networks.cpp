@@ -164,3 +164,41 @@ TEST(PalmNetworks, AgreeWithOpenCvDnn) {
 #else
 TEST(PalmNetworks, AgreeWithOpenCvDnn) { GTEST_SKIP() << "OpenCV's dnn module (libopencv-dnn-dev) is not installed"; }
 #endif
+
+// the network the build wrote as source and compiled into this test
+extern "C" void test_palm_seed7(NnDetector& detector);
+LQ::SharedPtr<NnDetector> test_palm_seed7();
+
+// The generated form builds the same network as the model file and the one in memory,
+// with its weights left in the constant tables.
+TEST(PalmNetworks, GeneratedSourceBuildsTheSameNetwork) {
+    const NnDetector made = palmNetwork("test_palm_seed7", kPalm35x33, LQ::BaseSize<int>(35, 33), 7);
+    LQ::SharedPtr<NnDetector> generated = test_palm_seed7();
+    EXPECT_TRUE(*generated == made);
+    EXPECT_TRUE(test_palm_seed7() == generated);
+    NnDetector copy;
+    test_palm_seed7(copy);
+    EXPECT_TRUE(copy == made);
+    NnDetector fromFile;
+    LQ::ArchiveI::load(std::string(TACTUS_TEST_NETWORK) + ".nn", fromFile);
+    EXPECT_TRUE(fromFile == *generated);
+    for (const LQ::SharedPtr<BaseLayer>& layer : generated->getNetwork()) {
+        if (layer->type() == "ConvolutionLayer") {
+            EXPECT_FALSE(static_cast<const ConvolutionLayer&>(*layer).getFilter().getMemory().isOwning());
+        }
+    }
+
+    std::mt19937 random(8);
+    const LQ::Image image = randomImage(random, LQ::BaseSize<int>(35, 33));
+    const std::vector<float> expected = NnDetector(made).detect(image);
+    EXPECT_EQ(static_cast<std::vector<float>>(generated->detect(image)), expected);
+
+    std::ifstream source(std::string(TACTUS_TEST_NETWORK) + ".cpp");
+    const std::string text((std::istreambuf_iterator<char>(source)), std::istreambuf_iterator<char>());
+    EXPECT_NE(text.find("    DLL_DECLSPEC void test_palm_seed7(NNDetector& detector);\n"), std::string::npos);
+    EXPECT_NE(text.find("    // set layer #1:\n    LQ::SharedPtr<BaseLayer> p_conv1(&conv1(), false);\n"
+                        "    nnDetector.addLayer(p_conv1);\n    p_conv1->addBottomLayer(p_data);\n\n"),
+              std::string::npos);
+    EXPECT_NE(text.find("    nnDetector.setSize(LQ::Size(35, 33));\n"), std::string::npos);
+    EXPECT_NE(text.find("// random weights, seed 7\n// not trained\n"), std::string::npos);
+}
