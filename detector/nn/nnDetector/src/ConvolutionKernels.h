@@ -57,6 +57,10 @@ void multiplyPanelsNeon(const float* packed, const float* bias, int rows, int de
                         int columnStride, int count, float* out, int outStride);
 #endif
 // the best of the two for this build
+#if defined(__x86_64__) || defined(__i386__)
+void multiplyPanelsAvx2(const float* packed, const float* bias, int rows, int depth, const float* columns,
+                        int columnStride, int count, float* out, int outStride);
+#endif
 void multiplyPanels(const float* packed, const float* bias, int rows, int depth, const float* columns,
                     int columnStride, int count, float* out, int outStride);
 

@@ -155,29 +155,34 @@ TEST(ConvolutionKernels, ByHand) {
 // The vector form of the panel product gives the scalar bits on random matrices of odd
 // shapes, and writes nothing outside its rows and columns.
 TEST(ConvolutionKernels, PanelProduct) {
+    using Product = void (*)(const float*, const float*, int, int, const float*, int, int, float*, int);
+    std::vector<Product> forms;
 #if defined(LQ_HAVE_NEON)
+    forms.push_back(LQ::multiplyPanelsNeon);
+#endif
+#if defined(__x86_64__) || defined(__i386__)
+    if (__builtin_cpu_supports("avx2")) forms.push_back(LQ::multiplyPanelsAvx2);
+#endif
+    if (forms.empty()) GTEST_SKIP() << "no vector form in this build";
     std::mt19937 rng(11);
     std::vector<float> packed;
-    for (int rows : {1, 3, 4, 6, 9})
-        for (int depth : {1, 7, 90})
-            for (int count : {1, 3, 4, 5, 8, 13, 21, 37}) {
-                const Blob w = random(1, 1, rows, depth, rng), b = random(1, 1, 1, rows, rng);
-                const int columnStride = count + 3, outStride = count + 2;
-                const Blob m = random(1, 1, depth, columnStride, rng);
-                LQ::packPanels(w.data(), rows, depth, packed);
-                std::vector<float> scalar(rows * outStride + 1, 7.f), vector(scalar);
-                LQ::multiplyPanelsScalar(packed.data(), b.data(), rows, depth, m.data(), columnStride, count,
-                                         scalar.data(), outStride);
-                LQ::multiplyPanelsNeon(packed.data(), b.data(), rows, depth, m.data(), columnStride, count,
-                                       vector.data(), outStride);
-                ASSERT_EQ(std::memcmp(scalar.data(), vector.data(), sizeof(float) * scalar.size()), 0)
-                    << rows << " x " << depth << " x " << count;
-                EXPECT_EQ(vector[outStride - 1], 7.f);
-                EXPECT_EQ(vector.back(), 7.f);
-            }
-#else
-    GTEST_SKIP() << "no vector form in this build";
-#endif
+    for (Product form : forms)
+        for (int rows : {1, 3, 4, 6, 9})
+            for (int depth : {1, 7, 90})
+                for (int count : {1, 3, 4, 5, 8, 13, 21, 37}) {
+                    const Blob w = random(1, 1, rows, depth, rng), b = random(1, 1, 1, rows, rng);
+                    const int columnStride = count + 3, outStride = count + 2;
+                    const Blob m = random(1, 1, depth, columnStride, rng);
+                    LQ::packPanels(w.data(), rows, depth, packed);
+                    std::vector<float> scalar(rows * outStride + 1, 7.f), vector(scalar);
+                    LQ::multiplyPanelsScalar(packed.data(), b.data(), rows, depth, m.data(), columnStride, count,
+                                             scalar.data(), outStride);
+                    form(packed.data(), b.data(), rows, depth, m.data(), columnStride, count, vector.data(), outStride);
+                    ASSERT_EQ(std::memcmp(scalar.data(), vector.data(), sizeof(float) * scalar.size()), 0)
+                        << rows << " x " << depth << " x " << count;
+                    EXPECT_EQ(vector[outStride - 1], 7.f);
+                    EXPECT_EQ(vector.back(), 7.f);
+                }
 }
 
 // Outputs worked out by hand: two channels summed, the window dropped at stride 2, the
