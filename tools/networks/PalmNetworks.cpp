@@ -19,14 +19,12 @@ const std::vector<ConvShape> kPalm50x60 = {
     {"conv82", 10, 10, 3, 3, 1, 1}, {"conv83", 10, 10, 3, 3, 1, 1}, {"conv84", 10, 10, 3, 3, 1, 1},
     {"conv9", 30, 10, 5, 2, 1, 0},  {"final", 2, 30, 1, 1, 1, 0}};
 
-namespace {
 Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale) {
     Blob blob(n, c, h, w);
     std::uniform_real_distribution<float> value(-scale, scale);
     for (int i = 0; i < blob.size(); ++i) blob.data()[i] = value(random);
     return blob;
 }
-}  // namespace
 
 NnDetector palmNetwork(const std::string& name, const std::vector<ConvShape>& shape, LQ::BaseSize<int> size,
                        unsigned int seed) {

@@ -2,6 +2,7 @@
 // The two palm verifier shapes, built with random weights from a seed: the tests compare
 // them with other runtimes and the benchmarks time them; the trainer fills them in.
 
+#include <random>
 #include <string>
 #include <vector>
 
@@ -15,6 +16,9 @@ struct ConvShape {
 // every convolution but "final" is followed by a PReLU
 extern const std::vector<ConvShape> kPalm35x33;
 extern const std::vector<ConvShape> kPalm50x60;
+
+// values uniform in -scale to scale
+Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale);
 
 // a chain of the given convolutions after a data layer, weights uniform and scaled to
 // the filter volume

@@ -19,13 +19,6 @@
 
 namespace {
 
-Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale) {
-    Blob blob(n, c, h, w);
-    std::uniform_real_distribution<float> value(-scale, scale);
-    for (int i = 0; i < blob.size(); ++i) blob.data()[i] = value(random);
-    return blob;
-}
-
 LQ::Image randomImage(std::mt19937& random, LQ::BaseSize<int> size) {
     LQ::Image image(size, LQ::COLOR_MODE_MONO);
     for (int y = 0; y < size.height; ++y)
