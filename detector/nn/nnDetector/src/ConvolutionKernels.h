@@ -2,6 +2,7 @@
 // Float kernels under the weight-carrying layers: sums of products, the clamp, one plane
 // through one kernel, and the matrix product that runs the convolution layers.
 
+#include <cstddef>
 #include <vector>
 
 #include "LQ_Neon.h"
