@@ -6,6 +6,7 @@
 
 #include "AdaBoostDetector.h"
 #include "ClassifierRing.h"
+#include "Glyphs.h"
 #include "LQ_BaseDetector.h"
 #include "LQ_ImageData.h"
 #include "LQ_States.h"
@@ -19,74 +20,13 @@ using LQ::StateAggregator;
 
 namespace {
 
-// An "F" of bright cells on a 4 x 4 grid of 6-pixel cells: neither a turn nor a mirror of
-// it equals another, so each variant of the cascade finds only its own pose.
-const bool kF[4][4] = {{true, true, true, false},
-                       {true, false, false, false},
-                       {true, true, false, false},
-                       {true, false, false, false}};
-const int kWindow = 24;
-const unsigned char kDark = 40, kBright = 220;
+using glyphs::kBright;
+using glyphs::kDark;
+using glyphs::kWindow;
+using glyphs::Pose;
 
-// Tables outlive the cascades that point into them.
-struct Tables {
-    std::vector<LQ::schar> any = std::vector<LQ::schar>(256, 1);
-    std::vector<LQ::schar> bright = std::vector<LQ::schar>(256, -20);
-    std::vector<LQ::schar> dark = std::vector<LQ::schar>(256, -20);
-    Tables() {
-        for (int i = 127 + 25; i < 256; ++i) bright[i] = 1;
-        for (int i = 0; i <= 127 - 15; ++i) dark[i] = 1;
-    }
-};
-
-// A census stage that every window passes, then one Haar classifier per cell: the cell
-// against the rest of the window, brighter or darker as the F says.
-CascadedClassifier fCascade(Tables& tables) {
-    CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(kWindow, kWindow));
-    cascade.setName("F");
-    WeakClassifierRmct any(BasePoint<int>(12, 12));
-    any.setData(tables.any.data());
-    StrongClassifier first;
-    first.addRmctClassifier(any);
-    first.setThreshold(1);
-    StrongClassifier cells;
-    for (int row = 0; row < 4; ++row)
-        for (int col = 0; col < 4; ++col) {
-            WeakClassifierHaar haar;
-            haar.set(BaseRect<int>(0, 0, kWindow, kWindow), BaseRect<int>(col * 6, row * 6, col * 6 + 6, row * 6 + 6));
-            haar.setData(kF[row][col] ? tables.bright.data() : tables.dark.data());
-            cells.addHaarClassifier(haar);
-        }
-    cells.setThreshold(16);
-    cascade.addStrongClassifier(first);
-    cascade.addStrongClassifier(cells);
-    return cascade;
-}
-
-struct Pose {
-    bool flip;
-    int turns;
-};
-
-// Draws the F as the cascade variant (flipped first, then turned) sees it, scaled by s
-// with its window's top-left at (ox, oy).
-void drawF(Image& image, int ox, int oy, float s, Pose pose) {
-    const int extent = static_cast<int>(std::ceil(kWindow * s));
-    for (int y = oy; y < oy + extent && y < image.height(); ++y)
-        for (int x = ox; x < ox + extent && x < image.width(); ++x) {
-            float a = (x - ox + 0.5f) / s, b = (y - oy + 0.5f) / s;
-            if (a >= kWindow || b >= kWindow) continue;
-            for (int k = 0; k < pose.turns; ++k) {  // undo the turns
-                const float a0 = a;
-                a = kWindow - b;
-                b = a0;
-            }
-            if (pose.flip) a = kWindow - a;
-            const int col = std::min(3, static_cast<int>(a / 6)), row = std::min(3, static_cast<int>(b / 6));
-            if (kF[row][col]) image.pixel(x, y)[0] = kBright;
-        }
-}
+CascadedClassifier fCascade(glyphs::Tables& tables) { return glyphs::cascade(glyphs::kF, tables, "F"); }
+void drawF(Image& image, int ox, int oy, float s, Pose pose) { glyphs::draw(glyphs::kF, image, ox, oy, s, pose); }
 
 // A detector that counts its calls and may refuse: it resets the location of the hits
 // whose call numbers it is given.
@@ -114,7 +54,7 @@ AdaObject hit(int x, int score) {
 // reports exactly four objects, each with its centre, size, angle and hand. The base
 // cascade is labelled 30 degrees, so the variants carry the ring's derived angles.
 TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
-    Tables tables;
+    glyphs::Tables tables;
     CascadedClassifier base = fCascade(tables);
     base.setAngle(30);
     ClassifierRing ring(std::vector<CascadedClassifier*>{&base});
@@ -180,7 +120,7 @@ TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
 }
 
 TEST(AdaBoostDetector, ZoomsFollowTheWidthRange) {
-    Tables tables;
+    glyphs::Tables tables;
     CascadedClassifier cascade = fCascade(tables);
     AdaBoostDetector::Parameters parameters;
     parameters.pCascadedClassifiers = {&cascade};
@@ -220,7 +160,7 @@ TEST(AdaBoostDetector, ZoomsFollowTheWidthRange) {
 
 // What the verifier and the store target make of the hits, and the paths of nothing found.
 TEST(AdaBoostDetector, StoreTargetsVerifierAndLostPath) {
-    Tables tables;
+    glyphs::Tables tables;
     CascadedClassifier cascade = fCascade(tables);
     AdaBoostDetector::Parameters parameters;
     parameters.pCascadedClassifiers = {&cascade};

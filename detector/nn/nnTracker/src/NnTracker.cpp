@@ -67,6 +67,8 @@ void NnTracker::detect(LQ::SharedPtr<LQ::StateAggregator>& state) {
     state_ = LQ::SharedPtr<LQ::StateAggregator>();
     if (parameters_.type == Type::VERIFIER || parameters_.type == Type::MT_CNN)
         state->get<LQ::VerifiedState>() = verified;
+    // a chain refuses an object by unsetting its location, as the data form clears its result
+    if (parameters_.type == Type::VERIFIER && !verified) location.reset();
     state->get<LQ::ScoreState>() = score;
 }
 

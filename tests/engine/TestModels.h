@@ -1,0 +1,46 @@
+#pragma once
+// A model directory made by the tests: every ring the engines ask for, built from the
+// test glyphs, and the six networks and two palm verifiers, each a one-layer network whose
+// answer is fixed. Also NV21 frames with a glyph drawn upright for a given device turn.
+
+#include <string>
+#include <vector>
+
+#include "Glyphs.h"
+#include "LQ_Rect.h"
+
+namespace testModels {
+
+// what each network answers, whatever the patch
+struct Answers {
+    float fist = 1, thumbUp = 1, victory = 1, heart = 1;
+    float pointer = 0.5f;  // passes the lax pointer verifier, fails the strict one
+    float palm = 1;        // the rejectors' palm verifiers
+};
+
+// the palm ring fires on glyphs::kFrame, every other ring on glyphs::kF
+void write(const std::string& directory, const Answers& answers = Answers());
+
+// a fresh directory under the test's temporary directory
+std::string makeDirectory(const std::string& name);
+
+constexpr int kCameraWidth = 1280, kCameraHeight = 720;
+
+// One camera frame. The engine halves it and turns the half by `turns` quarter turns
+// (pixel (x, y) to column y, row W - 1 - x for one turn); a glyph given in that upright,
+// half-size image is drawn so that the engine sees it upright.
+class Frame {
+public:
+    explicit Frame(int turns);
+    void draw(const glyphs::Glyph& glyph, float uprightLeft, float uprightTop, float scale);
+    // the camera pixels that come from the upright rectangle, as a box
+    LQ::BaseRect<float> cameraBox(const LQ::BaseRect<float>& upright) const;
+    std::vector<unsigned char>& nv21() { return nv21_; }
+
+private:
+    void toUpright(int x, int y, float& u, float& v) const;
+    int turns_;
+    std::vector<unsigned char> nv21_;
+};
+
+}  // namespace testModels
