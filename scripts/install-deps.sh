@@ -5,7 +5,8 @@
 #   scripts/install-deps.sh --cross    also the AArch64 cross compiler and qemu
 set -euo pipefail
 
-packages=(cmake ninja-build g++ libgtest-dev libgmock-dev libbenchmark-dev libsimde-dev libyuv-dev libopencv-dev)
+packages=(cmake ninja-build g++ libgtest-dev libgmock-dev libbenchmark-dev libsimde-dev libyuv-dev libopencv-dev
+          pkg-config libavformat-dev libavcodec-dev libavutil-dev libswscale-dev)
 if [[ "${1:-}" == "--cross" ]]; then
   packages+=(g++-aarch64-linux-gnu qemu-user googletest)
 fi

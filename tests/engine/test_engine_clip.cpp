@@ -1,6 +1,7 @@
 // The engine as a camera application sees it: only the exported C functions, frames of
 // NV21 at 1280 x 720, and the test's own rings and networks in the model directory.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cmath>
@@ -10,11 +11,11 @@
 #include <string>
 #include <vector>
 
-#include "TestModels.h"
+#include "GlyphModels.h"
 #include "VI_Tactus_Interface.h"
 
 using LQ::BaseRect;
-using testModels::Frame;
+using glyphModels::Frame;
 
 namespace {
 
@@ -68,11 +69,17 @@ std::string stderrOf(F f) {
     return text.str();
 }
 
+std::string makeDirectory(const std::string& name) {
+    const std::string path = ::testing::TempDir() + "tactus_" + name + "_" + std::to_string(getpid());
+    mkdir(path.c_str(), 0700);
+    return path;
+}
+
 std::string& modelDirectory() {
     static std::string directory;
     if (directory.empty()) {
-        directory = testModels::makeDirectory("models");
-        testModels::write(directory);
+        directory = makeDirectory("models");
+        glyphModels::write(directory);
     }
     return directory;
 }
@@ -86,7 +93,7 @@ void start(const char* mode, const char* isFlip = "true") {
 }
 
 std::vector<Gesture> run(Frame& frame, const char* key = "orientation", const char* value = "0") {
-    VI_Tactus_SetFrame(frame.nv21().data(), testModels::kCameraWidth, testModels::kCameraHeight * 3 / 2, 0);
+    VI_Tactus_SetFrame(frame.nv21().data(), glyphModels::kCameraWidth, glyphModels::kCameraHeight * 3 / 2, 0);
     if (key) VI_Tactus_SetFrameParameter(key, value);
     VI_Tactus_ProcessFrame();
     return results();
@@ -103,8 +110,8 @@ int turnsOf(int orientation, bool isFlip) {
 // the camera box of a square upright window, mirrored left to right for a front camera
 BaseRect<float> expectedBox(const Frame& frame, float left, float top, float size, bool isFlip) {
     BaseRect<float> box = frame.cameraBox(BaseRect<float>(left, top, left + size, top + size));
-    if (isFlip) box = BaseRect<float>(testModels::kCameraWidth - box.right, box.top,
-                                      testModels::kCameraWidth - box.left, box.bottom);
+    if (isFlip) box = BaseRect<float>(glyphModels::kCameraWidth - box.right, box.top,
+                                      glyphModels::kCameraWidth - box.left, box.bottom);
     return box;
 }
 
@@ -123,7 +130,7 @@ const float kSize = glyphs::kWindow * kScale;  // in the upright half-size image
 
 // Failure paths first: a process loads its networks once, and these must see the first load.
 TEST(EngineClip, AMissingNetworkFileReachesTheHostAndEveryFrameTriesAgain) {
-    const std::string empty = testModels::makeDirectory("empty");
+    const std::string empty = makeDirectory("empty");
     VI_Tactus_SetParameter("mode", "fist");
     VI_Tactus_SetParameter("nn-path", empty.c_str());
     VI_Tactus_Init();

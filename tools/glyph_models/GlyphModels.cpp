@@ -1,13 +1,8 @@
-#include "TestModels.h"
-
-#include <sys/stat.h>
-#include <unistd.h>
+#include "GlyphModels.h"
 
 #include <algorithm>
 #include <fstream>
 #include <stdexcept>
-
-#include <gtest/gtest.h>
 
 #include "ClassifierRing.h"
 #include "DataLayer.h"
@@ -15,7 +10,7 @@
 #include "LQ_ArchiveO.h"
 #include "NnDetector.h"
 
-namespace testModels {
+namespace glyphModels {
 
 namespace {
 
@@ -68,12 +63,6 @@ void write(const std::string& directory, const Answers& answers) {
     writeNetwork(directory + "/palm_verifier_iter_140000.nn", {answers.palm});
 }
 
-std::string makeDirectory(const std::string& name) {
-    const std::string path = ::testing::TempDir() + "tactus_" + name + "_" + std::to_string(getpid());
-    mkdir(path.c_str(), 0700);
-    return path;
-}
-
 Frame::Frame(int turns) : turns_(turns % 4), nv21_(kCameraWidth * kCameraHeight * 3 / 2, 128) {
     std::fill(nv21_.begin(), nv21_.begin() + kCameraWidth * kCameraHeight, glyphs::kDark);
 }
@@ -113,4 +102,4 @@ LQ::BaseRect<float> Frame::cameraBox(const LQ::BaseRect<float>& upright) const {
     return box;
 }
 
-}  // namespace testModels
+}  // namespace glyphModels

@@ -1,7 +1,8 @@
 #pragma once
-// A model directory made by the tests: every ring the engines ask for, built from the
-// test glyphs, and the six networks and two palm verifiers, each a one-layer network whose
-// answer is fixed. Also NV21 frames with a glyph drawn upright for a given device turn.
+// Stand-in models made from glyphs, for the tests and the sample run until trained
+// tables land: every ring the engines ask for, built from a glyph cascade, and the six
+// networks and two palm verifiers, each a one-layer network whose answer is fixed. Also
+// NV21 frames with a glyph drawn upright for a given device turn.
 
 #include <string>
 #include <vector>
@@ -9,7 +10,7 @@
 #include "Glyphs.h"
 #include "LQ_Rect.h"
 
-namespace testModels {
+namespace glyphModels {
 
 // what each network answers, whatever the patch
 struct Answers {
@@ -18,11 +19,9 @@ struct Answers {
     float palm = 1;        // the rejectors' palm verifiers
 };
 
-// the palm ring fires on glyphs::kFrame, every other ring on glyphs::kF
+// the palm ring fires on glyphs::kFrame, every other ring on glyphs::kF; throws
+// std::runtime_error if a file can't be written
 void write(const std::string& directory, const Answers& answers = Answers());
-
-// a fresh directory under the test's temporary directory
-std::string makeDirectory(const std::string& name);
 
 constexpr int kCameraWidth = 1280, kCameraHeight = 720;
 
@@ -43,4 +42,4 @@ private:
     std::vector<unsigned char> nv21_;
 };
 
-}  // namespace testModels
+}  // namespace glyphModels
