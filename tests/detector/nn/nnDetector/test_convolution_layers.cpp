@@ -185,6 +185,72 @@ TEST(ConvolutionKernels, PanelProduct) {
                 }
 }
 
+// The vector forms of the in-place product give the scalar bits on random inputs of odd
+// shapes, read through scattered tap offsets, and write nothing outside their rows and
+// columns; with the taps evenly spaced the scalar form is the matrix product, bit for bit.
+// The dot products taken several at a time keep the order of one taken alone.
+TEST(ConvolutionKernels, TapProduct) {
+    using Product =
+        void (*)(const float*, const float*, int, int, const float*, const int*, int, float*, int);
+    std::vector<Product> forms;
+#if defined(LQ_HAVE_NEON)
+    forms.push_back(LQ::convolveTapsNeon);
+#endif
+#if defined(__x86_64__) || defined(__i386__)
+    if (__builtin_cpu_supports("avx2")) forms.push_back(LQ::convolveTapsAvx2);
+#endif
+    std::mt19937 rng(12);
+    std::uniform_int_distribution<int> pick(0, 1 << 20);
+    std::vector<float> groups, panels;
+    for (int rows = 1; rows <= 13; ++rows)
+        for (int depth : {1, 9, 90})
+            for (int count : {1, 3, 4, 5, 7, 8, 9, 13, 16, 17, 20, 24, 37}) {
+                const Blob w = random(1, 1, rows, depth, rng), b = random(1, 1, 1, rows, rng);
+                const int span = count + 50, outStride = count + 2;
+                const Blob planes = random(1, 1, 1, span, rng);
+                std::vector<int> offsets(depth);
+                for (int& offset : offsets) offset = pick(rng) % (span - count + 1);
+                LQ::packTapGroups(w.data(), rows, depth, groups);
+                std::vector<float> scalar(rows * outStride + 1, 7.f);
+                LQ::convolveTapsScalar(groups.data(), b.data(), rows, depth, planes.data(), offsets.data(),
+                                       count, scalar.data(), outStride);
+                for (Product form : forms) {
+                    std::vector<float> vector(rows * outStride + 1, 7.f);
+                    form(groups.data(), b.data(), rows, depth, planes.data(), offsets.data(), count,
+                         vector.data(), outStride);
+                    ASSERT_EQ(std::memcmp(scalar.data(), vector.data(), sizeof(float) * scalar.size()), 0)
+                        << rows << " x " << depth << " x " << count;
+                }
+                for (int r = 0; r < rows; ++r) ASSERT_EQ(scalar[r * outStride + count], 7.f);
+                ASSERT_EQ(scalar.back(), 7.f);
+
+                // taps one row of a matrix apart
+                const Blob m = random(1, 1, depth, count, rng);
+                for (int k = 0; k < depth; ++k) offsets[k] = k * count;
+                LQ::convolveTapsScalar(groups.data(), b.data(), rows, depth, m.data(), offsets.data(), count,
+                                       scalar.data(), outStride);
+                LQ::packPanels(w.data(), rows, depth, panels);
+                std::vector<float> matrix(scalar.size(), 7.f);
+                LQ::multiplyPanelsScalar(panels.data(), b.data(), rows, depth, m.data(), count, count,
+                                         matrix.data(), outStride);
+                ASSERT_EQ(std::memcmp(scalar.data(), matrix.data(), sizeof(float) * scalar.size()), 0);
+            }
+
+    // terms from 1e-6 to 1e6, so that any change of order shows in the low bits
+    std::uniform_real_distribution<float> exponent(-6.f, 6.f);
+    std::vector<float> a(9 * 61), x(61), init(9), out(9);
+    for (float& v : a) v = std::pow(10.f, exponent(rng)) * (pick(rng) % 2 ? 1.f : -1.f);
+    for (float& v : x) v = std::pow(10.f, exponent(rng));
+    for (float& v : init) v = std::pow(10.f, exponent(rng));
+    for (int rows = 1; rows <= 9; ++rows)
+        for (int n : {0, 1, 7, 61}) {
+            LQ::dotProducts(a.data(), rows, 61, x.data(), n, init.data(), out.data());
+            for (int r = 0; r < rows; ++r)
+                ASSERT_EQ(out[r], LQ::dotProduct(a.data() + r * 61, x.data(), n, init[r]))
+                    << rows << " " << n;
+        }
+}
+
 // Outputs worked out by hand: two channels summed, the window dropped at stride 2, the
 // zero border, and the clamp after the bias. Both kernel paths must give these values.
 TEST(ConvolutionLayer, ByHand) {
@@ -196,7 +262,7 @@ TEST(ConvolutionLayer, ByHand) {
     const Blob filter = make(2, 2, 2, 2, {1, 0, 0, -1, 1, 1, 1, 1, 0, 0, 0, 2, 0, 0, 0, 0});
     for (bool reference : {false, true}) {
         ConvolutionLayer layer(filter, make(1, 1, 1, 2, {0.5f, -1}), "conv", 1, 0);
-        layer.setReferencePath(reference);
+        layer.setPath(reference ? ConvolutionLayer::Path::SlidingWindow : ConvolutionLayer::Path::Direct);
         const Blob& out = run(layer, input);
         EXPECT_EQ(out.shape(), "1 x 2 x 3 x 2");
         EXPECT_EQ(values(out),
@@ -205,27 +271,29 @@ TEST(ConvolutionLayer, ByHand) {
         // all ones through a 3 x 3 of ones with a border of 1: the count of cells inside
         ConvolutionLayer bordered(make(1, 1, 3, 3, std::vector<float>(9, 1.f)), make(1, 1, 1, 1, {0}), "b", 1,
                                   1);
-        bordered.setReferencePath(reference);
+        bordered.setPath(reference ? ConvolutionLayer::Path::SlidingWindow : ConvolutionLayer::Path::Direct);
         EXPECT_EQ(values(run(bordered, make(1, 1, 2, 5, std::vector<float>(10, 1.f)))),
                   (std::vector<float>{4, 6, 6, 6, 4, 4, 6, 6, 6, 4}));
 
         ConvolutionLayer strided(make(1, 1, 3, 3, std::vector<float>(9, 0.f)), make(1, 1, 1, 1, {0}), "s", 2,
                                  0);
-        strided.setReferencePath(reference);
+        strided.setPath(reference ? ConvolutionLayer::Path::SlidingWindow : ConvolutionLayer::Path::Direct);
         EXPECT_EQ(run(strided, make(1, 1, 60, 35, std::vector<float>(2100, 0.f))).shape(), "1 x 1 x 17 x 29");
 
         ConvolutionLayer clamped(make(1, 1, 1, 1, {1}), make(1, 1, 1, 1, {-2}), "r", 1, 0);
-        clamped.setReferencePath(reference);
+        clamped.setPath(reference ? ConvolutionLayer::Path::SlidingWindow : ConvolutionLayer::Path::Direct);
         EXPECT_EQ(values(run(clamped, make(1, 1, 1, 2, {1, 3}))), (std::vector<float>{-1, 1}));
         clamped.setDoRelu(true);
         EXPECT_EQ(values(run(clamped, make(1, 1, 1, 2, {1, 3}))), (std::vector<float>{0, 1}));
     }
 }
 
-// The matrix product against the plain loops on random blobs: odd sizes, many kernel shapes,
-// strides and borders, batches, pruned planes, the clamp, and one layer fed changing sizes
-// so that stale scratch would show.
-TEST(ConvolutionLayer, MatrixProductMatchesSlidingWindow) {
+// The direct path and the matrix product against the plain loops on random blobs: odd sizes,
+// many kernel shapes, strides and borders, batches, pruned planes, the clamp, and one layer
+// fed changing sizes so that stale scratch would show. The first two add the same terms in
+// the same order and agree bit for bit; the plain loops sum plane by plane and differ in
+// rounding.
+TEST(ConvolutionLayer, FastPathsMatchSlidingWindow) {
     std::mt19937 rng(5);
     std::uniform_int_distribution<int> pick(0, 1 << 20);
     const int kernels[][2] = {{1, 1}, {3, 3}, {3, 2}, {2, 3}, {5, 5}, {1, 4}};
@@ -233,7 +301,7 @@ TEST(ConvolutionLayer, MatrixProductMatchesSlidingWindow) {
     for (const auto& kernel : kernels)
         for (int stride : {1, 2, 3})
             for (int pad : {0, 1, 2}) {
-                const int channels = 1 + pick(rng) % 11, filters = 1 + pick(rng) % 11,
+                const int channels = 1 + pick(rng) % 13, filters = 1 + pick(rng) % 13,
                           num = 1 + pick(rng) % 2;
                 Blob filter = random(filters, channels, kernel[1], kernel[0], rng);
                 if (pick(rng) % 2)  // some planes all but zero, and then pruned
@@ -242,15 +310,23 @@ TEST(ConvolutionLayer, MatrixProductMatchesSlidingWindow) {
                 ConvolutionLayer fast(filter, random(1, 1, 1, filters, rng), "fast", stride, pad);
                 if (pick(rng) % 2) fast.prune();
                 fast.setDoRelu(pick(rng) % 2);
-                LQ::SharedPtr<BaseLayer> copy = fast.clone();
+                EXPECT_EQ(fast.getPath(), ConvolutionLayer::Path::Direct);
+                LQ::SharedPtr<BaseLayer> copy = fast.clone(), other = fast.clone();
                 ConvolutionLayer& slow = static_cast<ConvolutionLayer&>(*copy);
-                slow.setReferencePath(true);
+                ConvolutionLayer& matrix = static_cast<ConvolutionLayer&>(*other);
+                slow.setPath(ConvolutionLayer::Path::SlidingWindow);
+                matrix.setPath(ConvolutionLayer::Path::MatrixProduct);
                 for (int trial = 0; trial < 4; ++trial) {
-                    const int width = std::max(1, kernel[0] - 2 * pad) + pick(rng) % 13;
-                    const int height = std::max(1, kernel[1] - 2 * pad) + pick(rng) % 13;
+                    const int width = std::max(1, kernel[0] - 2 * pad) + pick(rng) % 20;
+                    const int height = std::max(1, kernel[1] - 2 * pad) + pick(rng) % 20;
                     const Blob input = random(num, channels, height, width, rng);
-                    const std::vector<float> a = values(run(fast, input)), b = values(run(slow, input));
+                    const std::vector<float> a = values(run(fast, input)), b = values(run(slow, input)),
+                                             m = values(run(matrix, input));
                     ASSERT_EQ(fast.getBlob().shape(), slow.getBlob().shape());
+                    ASSERT_EQ(a.size(), m.size());
+                    ASSERT_EQ(std::memcmp(a.data(), m.data(), sizeof(float) * a.size()), 0)
+                        << "kernel " << kernel[0] << " x " << kernel[1] << " stride " << stride << " pad "
+                        << pad << " input " << input.shape();
                     const float tolerance = 4.f * FLT_EPSILON * (filter.volume() + 1);
                     for (size_t i = 0; i < a.size(); ++i)
                         ASSERT_NEAR(a[i], b[i], tolerance)
@@ -259,7 +335,38 @@ TEST(ConvolutionLayer, MatrixProductMatchesSlidingWindow) {
                     compared += static_cast<int>(a.size());
                 }
             }
-    EXPECT_GT(compared, 5000);
+    EXPECT_GT(compared, 10000);
+}
+
+// The direct path packs the weights once and keeps them while they stay the same: weights
+// written through a shared blob, and planes pruned after a first frame, still count.
+TEST(ConvolutionLayer, DirectPathFollowsChangedWeights) {
+    std::mt19937 rng(14);
+    Blob filter = random(7, 3, 3, 3, rng);
+    const Blob bias = random(1, 1, 1, 7, rng);
+    Blob input = random(1, 3, 12, 11, rng);
+    // large on channel 2, so that the weights pruned there below make a difference
+    for (int i = 0; i < input.area(); ++i) input.data(0, 2, 0, 0)[i] *= 1e6f;
+    ConvolutionLayer layer(filter, bias, "c", 1, 0);
+    const std::vector<float> before = values(run(layer, input));
+    const auto fresh = [&](bool pruned) {
+        ConvolutionLayer made(filter, bias, "f", 1, 0);
+        if (pruned) made.prune();
+        return values(run(made, input));
+    };
+    EXPECT_EQ(before, fresh(false));
+
+    filter.data()[40] += 0.5f;  // filter 1, channel 1
+    const std::vector<float> changed = values(run(layer, input));
+    EXPECT_EQ(changed, fresh(false));
+    EXPECT_NE(changed, before);
+
+    std::fill_n(filter.data(filter.num() - 1, 2, 0, 0), 9, 1e-9f);
+    const std::vector<float> unpruned = values(run(layer, input));
+    layer.prune();
+    const std::vector<float> pruned = values(run(layer, input));
+    EXPECT_EQ(pruned, fresh(true));
+    EXPECT_NE(pruned, unpruned);
 }
 
 // A kernel as large as its (bordered) input is one dot product per filter, which ignores the
@@ -272,7 +379,7 @@ TEST(ConvolutionLayer, ScalarProductAndPruning) {
     EXPECT_EQ(whole.shape(), "1 x 2 x 1 x 1");
     EXPECT_FLOAT_EQ(whole.data()[0], 1.05f);
     for (bool reference : {false, true}) {
-        layer.setReferencePath(reference);
+        layer.setPath(reference ? ConvolutionLayer::Path::SlidingWindow : ConvolutionLayer::Path::Direct);
         EXPECT_EQ(values(run(layer, make(1, 2, 1, 2, {1, 2, 1e6f, 1e6f}))),
                   (std::vector<float>{1, 2, 0.25f, 0.25f}));
     }
@@ -301,6 +408,12 @@ TEST(ConvolutionLayer, Checks) {
     check = catchCheck([&] { run(layer, Blob(1, 3, 2, 2)); });
     EXPECT_EQ(check.expression, "(inputBottom.channels()) == (filter_.channels())");
     EXPECT_EQ(check.tail, "3 != 1");
+    // a border of 1 makes 1 x 2 into 3 x 4, still lower than the kernel
+    ConvolutionLayer large(Blob(1, 1, 5, 3), make(1, 1, 1, 1, {0}), "l", 1, 1);
+    check = catchCheck([&] { run(large, Blob(1, 1, 1, 2)); });
+    EXPECT_EQ(check.expression,
+              "inputSize.width >= filterSize.width && inputSize.height >= filterSize.height");
+    EXPECT_EQ(check.tail, "the input 4 x 3 with its border is smaller than the kernel 3 x 5");
 }
 
 // The file form: current, before the border ("Version 2") and before the stride
@@ -381,11 +494,13 @@ TEST(ConvolutionLayers, NoAllocationAfterFirstForward) {
     std::mt19937 rng(9);
     ConvolutionLayer conv(random(10, 3, 3, 3, rng), random(1, 1, 1, 10, rng), "c", 2, 1);
     ConvolutionLayer reference(conv.getFilter(), conv.getBias(), "r", 1, 0);
-    reference.setReferencePath(true);
+    reference.setPath(ConvolutionLayer::Path::SlidingWindow);
     reference.prune();
+    ConvolutionLayer pruned(conv.getFilter(), conv.getBias(), "p", 1, 0);
+    pruned.prune();
     DeConvolutionLayer deconv(random(2, 3, 2, 2, rng), random(1, 1, 1, 2, rng), "d", 2);
     const Blob input = random(2, 3, 13, 11, rng);
-    for (BaseLayer* layer : std::vector<BaseLayer*>{&conv, &reference, &deconv}) {
+    for (BaseLayer* layer : std::vector<BaseLayer*>{&conv, &reference, &pruned, &deconv}) {
         run(*layer, input);
         const long before = allocationCount;
         layer->forward();
