@@ -1,6 +1,10 @@
 #include "ConvolutionKernels.h"
 
+#include <algorithm>
+#include <array>
+#include <cstring>
 #include <type_traits>
+#include <utility>
 
 namespace LQ {
 
@@ -12,6 +16,25 @@ float dotProduct(const float* a, const float* b, int n, float init) {
         acc = acc + product;
     }
     return acc;
+}
+
+void dotProducts(const float* a, int rows, int step, const float* b, int n, const float* init, float* out) {
+    // each sum alone is a chain of dependent additions; four side by side fill the gaps
+    int r = 0;
+    for (; r + 4 <= rows; r += 4) {
+        const float* a0 = a + static_cast<size_t>(r) * step;
+        const float *a1 = a0 + step, *a2 = a1 + step, *a3 = a2 + step;
+        float s0 = init[r], s1 = init[r + 1], s2 = init[r + 2], s3 = init[r + 3];
+        for (int i = 0; i < n; ++i) {
+            const float x = b[i];
+            s0 = s0 + a0[i] * x;
+            s1 = s1 + a1[i] * x;
+            s2 = s2 + a2[i] * x;
+            s3 = s3 + a3[i] * x;
+        }
+        out[r] = s0, out[r + 1] = s1, out[r + 2] = s2, out[r + 3] = s3;
+    }
+    for (; r < rows; ++r) out[r] = dotProduct(a + static_cast<size_t>(r) * step, b, n, init[r]);
 }
 
 template <class T>
@@ -351,6 +374,276 @@ void multiplyPanels(const float* packed, const float* bias, int rows, int depth,
     multiplyPanelsNeon(packed, bias, rows, depth, columns, columnStride, count, out, outStride);
 #else
     multiplyPanelsScalar(packed, bias, rows, depth, columns, columnStride, count, out, outStride);
+#endif
+}
+
+namespace {
+// the indices j from 0 to size - 1 for which j * stride + phase - pad falls in 0 .. extent - 1
+inline void insideRange(int extent, int pad, int stride, int phase, int size, int& first, int& last) {
+    first = std::min(size, pad > phase ? (pad - phase + stride - 1) / stride : 0);
+    last = std::max(first, std::min(size, (extent + pad - phase + stride - 1) / stride));
+}
+}  // namespace
+
+void splitPhases(const float* input, int channels, int width, int height, int pad, int stride,
+                 float* planes) {
+    const int phaseWidth = phaseSize(width, pad, stride), phaseHeight = phaseSize(height, pad, stride);
+    const size_t plane = static_cast<size_t>(phaseWidth) * phaseHeight;
+    // zeros first, then the input over them: one fill costs less than a fill on each side
+    // of every short row
+    std::fill_n(planes, plane * channels * stride * stride, 0.f);
+    float* p = planes;
+    for (int c = 0; c < channels; ++c) {
+        const float* channel = input + static_cast<size_t>(c) * width * height;
+        for (int py = 0; py < stride; ++py) {
+            int top, bottom;
+            insideRange(height, pad, stride, py, phaseHeight, top, bottom);
+            for (int px = 0; px < stride; ++px, p += plane) {
+                int first, last;
+                insideRange(width, pad, stride, px, phaseWidth, first, last);
+                for (int i = top; i < bottom; ++i) {
+                    const float* in = channel + static_cast<size_t>(i * stride + py - pad) * width + px - pad;
+                    float* out = p + static_cast<size_t>(i) * phaseWidth;
+                    // a constant step lets the compiler gather with shuffles
+                    if (stride == 1) {
+                        for (int j = first; j < last; ++j) out[j] = in[j];
+                    } else if (stride == 2) {
+                        for (int j = first; j < last; ++j) out[j] = in[j * 2];
+                    } else {
+                        for (int j = first; j < last; ++j) out[j] = in[j * stride];
+                    }
+                }
+            }
+        }
+    }
+}
+
+void tapOffsets(int channels, int kernelWidth, int kernelHeight, int stride, int phaseWidth, int phaseHeight,
+                int* offsets) {
+    const int plane = phaseWidth * phaseHeight;
+    for (int c = 0; c < channels; ++c)
+        for (int ky = 0; ky < kernelHeight; ++ky)
+            for (int kx = 0; kx < kernelWidth; ++kx)
+                *offsets++ = ((c * stride + ky % stride) * stride + kx % stride) * plane +
+                             ky / stride * phaseWidth + kx / stride;
+}
+
+void compactRows(const float* wide, int rows, int wideStride, int phaseWidth, int outWidth, int outHeight,
+                 float* out) {
+    // Rows are a few tens of floats: whole blocks of eight, the last one ending at the row's
+    // end and overlapping the one before, cost less than a loop with a remainder.
+    constexpr size_t BLOCK = 8 * sizeof(float);
+    for (int r = 0; r < rows; ++r) {
+        const float* in = wide + static_cast<size_t>(r) * wideStride;
+        for (int y = 0; y < outHeight; ++y, in += phaseWidth, out += outWidth) {
+            if (outWidth >= 8) {
+                for (int x = 0; x + 8 < outWidth; x += 8) std::memcpy(out + x, in + x, BLOCK);
+                std::memcpy(out + outWidth - 8, in + outWidth - 8, BLOCK);
+            } else {
+                for (int x = 0; x < outWidth; ++x) out[x] = in[x];
+            }
+        }
+    }
+}
+
+namespace {
+// A group of rows runs as one register block: the rows are split into groups of at most
+// TAP_GROUP_ROWS, as even as possible, so that ten filters make two groups of five rather
+// than six and four.
+template <class Group>
+void forGroups(int rows, Group group) {
+    const int groups = (rows + TAP_GROUP_ROWS - 1) / TAP_GROUP_ROWS;
+    for (int g = 0, r0 = 0; g < groups; ++g) {
+        const int size = rows / groups + (g < rows % groups ? 1 : 0);
+        group(r0, size);
+        r0 += size;
+    }
+}
+
+// a group kernel for each size up to TAP_GROUP_ROWS, indexed by the size
+template <class Kernel, template <int> class Of, int... Sizes>
+constexpr std::array<Kernel, sizeof...(Sizes) + 1> groupTable(std::integer_sequence<int, Sizes...>) {
+    return {nullptr, &Of<Sizes + 1>::run...};
+}
+}  // namespace
+
+void packTapGroups(const float* weights, int rows, int depth, std::vector<float>& packed) {
+    packed.resize(static_cast<size_t>(rows) * depth);
+    forGroups(rows, [&](int r0, int size) {
+        float* group = packed.data() + static_cast<size_t>(r0) * depth;
+        for (int i = 0; i < size; ++i) {
+            const float* row = weights + static_cast<size_t>(r0 + i) * depth;
+            for (int k = 0; k < depth; ++k) group[k * size + i] = row[k];
+        }
+    });
+}
+
+void convolveTapsScalar(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                        const int* offsets, int count, float* out, int outStride) {
+    forGroups(rows, [&](int r0, int size) {
+        for (int i = 0; i < size; ++i) {
+            float* __restrict o = out + static_cast<size_t>(r0 + i) * outStride;
+            const float* w = packed + static_cast<size_t>(r0) * depth + i;
+            for (int j = 0; j < count; ++j) o[j] = bias[r0 + i];
+            for (int k = 0; k < depth; ++k) {
+                const float wk = w[k * size];
+                const float* __restrict column = planes + offsets[k];
+                for (int j = 0; j < count; ++j) o[j] = o[j] + column[j] * wk;
+            }
+        }
+    });
+}
+
+// The loops over the rows of a register block are unrolled before the compiler decides
+// where the accumulators live: unrolled later, they stay in a memory copy that is stored to
+// on every step.
+
+namespace {
+using TapGroup = void (*)(const float*, int, const float*, const float*, const int*, int, float*, int);
+}  // namespace
+
+#if defined(LQ_HAVE_NEON)
+namespace {
+// R rows against 4 * V columns from o and planes on; the R weights of a tap are next to
+// each other. vmlaq is a multiply then an add, as in the scalar form, so each lane gives
+// the scalar bits.
+template <int R, int V>
+inline void tapBlockNeon(const float* w, int depth, const float* b, const float* planes, const int* offsets,
+                         float* o, int outStride) {
+    float32x4_t a[R * V];
+#pragma GCC unroll 16
+    for (int i = 0; i < R * V; ++i) a[i] = vdupq_n_f32(b[i / V]);
+    for (int k = 0; k < depth; ++k, w += R) {
+        const float* column = planes + offsets[k];
+        float32x4_t x[V];
+#pragma GCC unroll 16
+        for (int v = 0; v < V; ++v) x[v] = vld1q_f32(column + 4 * v);
+#pragma GCC unroll 16
+        for (int i = 0; i < R * V; ++i) a[i] = vmlaq_n_f32(a[i], x[i % V], w[i / V]);
+    }
+#pragma GCC unroll 16
+    for (int i = 0; i < R * V; ++i) vst1q_f32(o + static_cast<size_t>(i / V) * outStride + 4 * (i % V), a[i]);
+}
+
+// All count columns of R rows in blocks of eight, or four below eight; a remainder is one
+// more block ending at the last column, whose overlap comes out the same. count is at least 4.
+template <int R>
+struct TapGroupNeon {
+    static void run(const float* w, int depth, const float* b, const float* planes, const int* offsets,
+                    int count, float* o, int outStride) {
+        int j = 0;
+        for (; j + 8 <= count; j += 8) tapBlockNeon<R, 2>(w, depth, b, planes + j, offsets, o + j, outStride);
+        if (j == count) return;
+        if (count >= 8 && count - j > 4) {
+            tapBlockNeon<R, 2>(w, depth, b, planes + count - 8, offsets, o + count - 8, outStride);
+            return;
+        }
+        if (count - j > 4) tapBlockNeon<R, 1>(w, depth, b, planes + j, offsets, o + j, outStride);
+        tapBlockNeon<R, 1>(w, depth, b, planes + count - 4, offsets, o + count - 4, outStride);
+    }
+};
+}  // namespace
+
+void convolveTapsNeon(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                      const int* offsets, int count, float* out, int outStride) {
+    if (count < 4) {
+        convolveTapsScalar(packed, bias, rows, depth, planes, offsets, count, out, outStride);
+        return;
+    }
+    static constexpr auto groups =
+        groupTable<TapGroup, TapGroupNeon>(std::make_integer_sequence<int, TAP_GROUP_ROWS>());
+    forGroups(rows, [&](int r0, int size) {
+        groups[size](packed + static_cast<size_t>(r0) * depth, depth, bias + r0, planes, offsets, count,
+                     out + static_cast<size_t>(r0) * outStride, outStride);
+    });
+}
+#endif
+
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+// R rows against 8 * V columns in eight-lane registers: with six rows and two vectors,
+// twelve accumulators, two vectors of input and a weight fill fifteen of the sixteen
+// registers. A multiply and then an add, not a fused one, so that each lane gives the
+// scalar bits.
+template <int R, int V>
+__attribute__((target("avx2"))) inline void tapBlockAvx2(const float* w, int depth, const float* b,
+                                                         const float* planes, const int* offsets, float* o,
+                                                         int outStride) {
+    static_assert(V == 1 || V == 2, "one or two vectors per row");
+    __m256 a[R], c[R];
+#pragma GCC unroll 16
+    for (int i = 0; i < R; ++i) a[i] = c[i] = _mm256_set1_ps(b[i]);
+    for (int k = 0; k < depth; ++k, w += R) {
+        const float* column = planes + offsets[k];
+        const __m256 x0 = _mm256_loadu_ps(column);
+        const __m256 x1 = V == 2 ? _mm256_loadu_ps(column + 8) : x0;
+#pragma GCC unroll 16
+        for (int i = 0; i < R; ++i) {
+            const __m256 wi = _mm256_broadcast_ss(w + i);
+            a[i] = _mm256_add_ps(a[i], _mm256_mul_ps(x0, wi));
+            if (V == 2) c[i] = _mm256_add_ps(c[i], _mm256_mul_ps(x1, wi));
+        }
+    }
+#pragma GCC unroll 16
+    for (int i = 0; i < R; ++i) {
+        float* row = o + static_cast<size_t>(i) * outStride;
+        _mm256_storeu_ps(row, a[i]);
+        if (V == 2) _mm256_storeu_ps(row + 8, c[i]);
+    }
+}
+
+// all count columns of R rows in blocks of sixteen; a remainder is one more block of
+// sixteen or eight ending at the last column. count is at least 8.
+template <int R>
+struct TapGroupAvx2 {
+    __attribute__((target("avx2"))) static void run(const float* w, int depth, const float* b,
+                                                    const float* planes, const int* offsets, int count,
+                                                    float* o, int outStride) {
+        int j = 0;
+        for (; j + 16 <= count; j += 16)
+            tapBlockAvx2<R, 2>(w, depth, b, planes + j, offsets, o + j, outStride);
+        if (j == count) return;
+        if (count >= 16 && count - j > 8) {
+            tapBlockAvx2<R, 2>(w, depth, b, planes + count - 16, offsets, o + count - 16, outStride);
+            return;
+        }
+        if (count - j > 8) tapBlockAvx2<R, 1>(w, depth, b, planes + j, offsets, o + j, outStride);
+        tapBlockAvx2<R, 1>(w, depth, b, planes + count - 8, offsets, o + count - 8, outStride);
+    }
+};
+}  // namespace
+
+void convolveTapsAvx2(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                      const int* offsets, int count, float* out, int outStride) {
+    if (count < 8) {
+        convolveTapsScalar(packed, bias, rows, depth, planes, offsets, count, out, outStride);
+        return;
+    }
+    static constexpr auto groups =
+        groupTable<TapGroup, TapGroupAvx2>(std::make_integer_sequence<int, TAP_GROUP_ROWS>());
+    forGroups(rows, [&](int r0, int size) {
+        groups[size](packed + static_cast<size_t>(r0) * depth, depth, bias + r0, planes, offsets, count,
+                     out + static_cast<size_t>(r0) * outStride, outStride);
+    });
+}
+#endif
+
+void convolveTaps(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                  const int* offsets, int count, float* out, int outStride) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    convolveTapsNeon(packed, bias, rows, depth, planes, offsets, count, out, outStride);
+#elif defined(LQ_HAVE_SSSE3)
+    static const auto convolve = __builtin_cpu_supports("avx2") ? convolveTapsAvx2 :
+#if defined(LQ_HAVE_NEON)
+                                                                convolveTapsNeon;
+#else
+                                                                convolveTapsScalar;
+#endif
+    convolve(packed, bias, rows, depth, planes, offsets, count, out, outStride);
+#elif defined(LQ_HAVE_NEON)
+    convolveTapsNeon(packed, bias, rows, depth, planes, offsets, count, out, outStride);
+#else
+    convolveTapsScalar(packed, bias, rows, depth, planes, offsets, count, out, outStride);
 #endif
 }
 

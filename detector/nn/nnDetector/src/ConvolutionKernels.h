@@ -1,6 +1,7 @@
 #pragma once
 // Float kernels under the weight-carrying layers: sums of products, the clamp, one plane
-// through one kernel, and the matrix product that runs the convolution layers.
+// through one kernel, the matrix product over unfolded patches, and the same sums read in
+// place, which run the convolution layers.
 
 #include <cstddef>
 #include <vector>
@@ -11,6 +12,9 @@ namespace LQ {
 
 // acc = init, then acc = acc + a[i] * b[i] for i upward, multiply and add kept apart
 float dotProduct(const float* a, const float* b, int n, float init);
+// out[r] = dotProduct(a + r * step, b, n, init[r]) for r below rows: the same bits, several
+// rows at a time so that their running sums overlap in the pipeline
+void dotProducts(const float* a, int rows, int step, const float* b, int n, const float* init, float* out);
 
 // p[i] = max(p[i], value) in place; p[i] stays unless it is below value, so NaN and -0 stay
 template <class T>
@@ -64,5 +68,54 @@ void multiplyPanelsAvx2(const float* packed, const float* bias, int rows, int de
 #endif
 void multiplyPanels(const float* packed, const float* bias, int rows, int depth, const float* columns,
                     int columnStride, int count, float* out, int outStride);
+
+// ---- the convolution read in place ------------------------------------------------------
+// The sums of the matrix product without the unfolded copy: column k is the input read from
+// planes + offsets[k] on, so out(r, j) = bias[r] + sum over k upward of weight(r, k) *
+// planes[offsets[k] + j], multiply and add kept apart. Each output gets the bits of the
+// matrix product.
+//
+// To make every tap one such run, the bordered input is split by phase of the stride: plane
+// (c, py, px) holds bordered(c, y * stride + py, x * stride + px). Then tap (c, ky, kx) of output
+// (y, x) sits at j = y * phaseWidth + x of plane (c, ky % stride, kx % stride), shifted by
+// (ky / stride) * phaseWidth + kx / stride. Sums from outWidth to phaseWidth - 1 of each row
+// fall between output rows and are dropped by compactRows; count is
+// (outHeight - 1) * phaseWidth + outWidth, and no read leaves the planes.
+
+// the side of a phase plane: the bordered side divided by the stride, rounded up
+inline int phaseSize(int size, int pad, int stride) {
+    return (size + 2 * pad + stride - 1) / stride;
+}
+// channels x stride x stride planes of phaseSize(height) x phaseSize(width), zero in the
+// border and past the input
+void splitPhases(const float* input, int channels, int width, int height, int pad, int stride, float* planes);
+// where each tap starts, in the filter's order (c, ky, kx)
+void tapOffsets(int channels, int kernelWidth, int kernelHeight, int stride, int phaseWidth, int phaseHeight,
+                int* offsets);
+// rows of sums at wideStride into outHeight x outWidth planes, dropping the spare sums
+void compactRows(const float* wide, int rows, int wideStride, int phaseWidth, int outWidth, int outHeight,
+                 float* out);
+
+// The rows are computed in groups of up to this many, as evenly split as possible; the
+// weights are packed group by group, a group of g rows from row r0 holding weight(r0 + i, k)
+// at r0 * depth + k * g + i, so that a tap's weights for the group are one short run.
+constexpr int TAP_GROUP_ROWS = 6;
+void packTapGroups(const float* weights, int rows, int depth, std::vector<float>& packed);
+
+// The weights come from packTapGroups. The scalar form is the reference; the vector forms
+// give its bits, lane by lane.
+void convolveTapsScalar(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                        const int* offsets, int count, float* out, int outStride);
+#if defined(LQ_HAVE_NEON)
+void convolveTapsNeon(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                      const int* offsets, int count, float* out, int outStride);
+#endif
+#if defined(__x86_64__) || defined(__i386__)
+void convolveTapsAvx2(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                      const int* offsets, int count, float* out, int outStride);
+#endif
+// the best form for this build and machine
+void convolveTaps(const float* packed, const float* bias, int rows, int depth, const float* planes,
+                  const int* offsets, int count, float* out, int outStride);
 
 }  // namespace LQ

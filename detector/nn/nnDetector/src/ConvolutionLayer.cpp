@@ -1,6 +1,7 @@
 #include "ConvolutionLayer.h"
 
 #include <cmath>
+#include <algorithm>
 #include <cstring>
 
 #include "ConvolutionKernels.h"
@@ -61,29 +62,32 @@ void ConvolutionLayer::forward() {
     LQ_ASSERT_MSG(stride_ >= 1, "Stride is not correct, stride = " << stride_);
     LQ_ASSERT_MSG(pad_ >= 0, "Pad is not correct, pad = " << pad_);
 
-    const Blob input = workingInput(inputBottom);
-    const LQ::Size inputSize(input.width(), input.height());
+    const LQ::Size inputSize(inputBottom.width() + 2 * pad_, inputBottom.height() + 2 * pad_);
     const LQ::Size filterSize(filter_.width(), filter_.height());
+    // a smaller input would have the kernel read past it
+    LQ_ASSERT_MSG(inputSize.width >= filterSize.width && inputSize.height >= filterSize.height,
+                  "the input " << inputSize.width << " x " << inputSize.height
+                               << " with its border is smaller than the kernel " << filterSize.width << " x "
+                               << filterSize.height);
     // rounded down: a last window that doesn't fit is dropped
     const LQ::Size outputSize((inputSize.width - filterSize.width) / stride_ + 1,
                               (inputSize.height - filterSize.height) / stride_ + 1);
-    top_.init(input.num(), filter_.num(), outputSize.height, outputSize.width);
+    top_.init(inputBottom.num(), filter_.num(), outputSize.height, outputSize.width);
     if (inputSize == filterSize) {
-        calculateLayerAsScalarProduct(input);
-    } else if (referencePath_) {
-        calculateLayerBySlidingWindow(input, inputSize, outputSize, filterSize);
+        calculateLayerAsScalarProduct(workingInput(inputBottom));
+    } else if (path_ == Path::SlidingWindow) {
+        calculateLayerBySlidingWindow(workingInput(inputBottom), inputSize, outputSize, filterSize);
+    } else if (path_ == Path::MatrixProduct) {
+        calculateLayerByMatrixProduct(workingInput(inputBottom), inputSize, outputSize, filterSize);
     } else {
-        calculateLayerByMatrixProduct(input, inputSize, outputSize, filterSize);
+        calculateLayerDirectly(inputBottom, outputSize, filterSize);
     }
 }
 
 void ConvolutionLayer::calculateLayerAsScalarProduct(const Blob& input) {
-    const float* bias = bias_.data();
-    for (int n = 0; n < input.num(); ++n) {
-        const float* sample = input.data(n, 0, 0, 0);
-        for (int f = 0; f < filter_.num(); ++f)
-            *top_.data(n, f, 0, 0) = LQ::dotProduct(filter_.data(f, 0, 0, 0), sample, filterVolume_, bias[f]);
-    }
+    for (int n = 0; n < input.num(); ++n)
+        LQ::dotProducts(filter_.data(), filter_.num(), filterVolume_, input.data(n, 0, 0, 0), filterVolume_,
+                        bias_.data(), top_.data(n, 0, 0, 0));
     if (doRelu_) LQ::maxVector(top_.data(), top_.size(), 0.f);
 }
 
@@ -151,6 +155,63 @@ void ConvolutionLayer::calculateLayerByMatrixProduct(const Blob& input, const LQ
     if (doRelu_) LQ::maxVector(top_.data(), top_.size(), 0.f);
 }
 
+void ConvolutionLayer::calculateLayerDirectly(const Blob& input, const LQ::Size& outputSize,
+                                              const LQ::Size& filterSize) {
+    const int rows = filter_.num(), depth = filterVolume_, channels = input.channels();
+    const int kernelArea = filterSize.area();
+    // The weights may have been replaced or written through a shared blob since the last
+    // frame. Comparing them with the ones packed costs a small part of packing again.
+    const size_t weightCount = static_cast<size_t>(rows) * depth;
+    if (packedFrom_.size() != weightCount || packedPruned_ != pruned_ ||
+        (weightCount > 0 &&
+         std::memcmp(packedFrom_.data(), filter_.data(), sizeof(float) * weightCount) != 0)) {
+        packedFrom_.assign(filter_.data(), filter_.data() + weightCount);
+        packedPruned_ = pruned_;
+        const float* weights = packedFrom_.data();
+        // a pruned pair adds zeros instead of being skipped, as in the matrix product
+        if (!pruned_.empty()) {
+            columns_.assign(weights, weights + weightCount);
+            for (int f = 0; f < rows; ++f)
+                for (int c = 0; c < channels; ++c)
+                    if (pruned_[static_cast<size_t>(f) * channels + c])
+                        std::fill_n(columns_.data() + static_cast<size_t>(f) * depth + c * kernelArea,
+                                    kernelArea, 0.f);
+            weights = columns_.data();
+        }
+        LQ::packTapGroups(weights, rows, depth, groups_);
+    }
+    const int phaseWidth = LQ::phaseSize(input.width(), pad_, stride_);
+    const int phaseHeight = LQ::phaseSize(input.height(), pad_, stride_);
+    const std::array<int, 6> geometry = {channels, filterSize.width, filterSize.height,
+                                         stride_,  phaseWidth,       phaseHeight};
+    if (geometry != offsetsFor_ || offsets_.size() != static_cast<size_t>(depth)) {
+        offsets_.resize(depth);
+        LQ::tapOffsets(channels, filterSize.width, filterSize.height, stride_, phaseWidth, phaseHeight,
+                       offsets_.data());
+        offsetsFor_ = geometry;
+    }
+    // without a border or a stride the input is its own single phase
+    const bool split = pad_ > 0 || stride_ > 1;
+    if (split) phases_.resize(static_cast<size_t>(channels) * stride_ * stride_ * phaseWidth * phaseHeight);
+    // with spare sums between the rows, the sums go to scratch and are compacted
+    const int count = (outputSize.height - 1) * phaseWidth + outputSize.width;
+    const bool wide = phaseWidth != outputSize.width;
+    if (wide) wide_.resize(static_cast<size_t>(rows) * count);
+    for (int n = 0; n < input.num(); ++n) {
+        const float* planes = input.data(n, 0, 0, 0);
+        if (split) {
+            LQ::splitPhases(planes, channels, input.width(), input.height(), pad_, stride_, phases_.data());
+            planes = phases_.data();
+        }
+        float* out = top_.data(n, 0, 0, 0);
+        LQ::convolveTaps(groups_.data(), bias_.data(), rows, depth, planes, offsets_.data(), count,
+                         wide ? wide_.data() : out, count);
+        if (wide)
+            LQ::compactRows(wide_.data(), rows, count, phaseWidth, outputSize.width, outputSize.height, out);
+    }
+    if (doRelu_) LQ::maxVector(top_.data(), top_.size(), 0.f);
+}
+
 void ConvolutionLayer::serialize(LQ::ArchiveO& archive) const {
     archive & filter_ & bias_ & filterVolume_;
     archive.archiveFromVersion("Version 2", stride_);
@@ -193,7 +254,7 @@ LQ::SharedPtr<BaseLayer> ConvolutionLayer::clone() {
     layer->pad_ = pad_;
     layer->filterVolume_ = filterVolume_;
     layer->doRelu_ = doRelu_;
-    layer->referencePath_ = referencePath_;
+    layer->path_ = path_;
     return LQ::SharedPtr<BaseLayer>(layer);
 }
 

@@ -2,6 +2,7 @@
 // Convolution of all input channels by each filter (a cross-correlation: the kernel isn't
 // flipped), with a stride and a zero border. Nearly all the time of a frame is spent here.
 
+#include <array>
 #include <string>
 #include <vector>
 
@@ -31,18 +32,22 @@ public:
     LQ::SharedPtr<BaseLayer> clone() override;
     bool compare(const BaseLayer& layer) const override;
 
+    // How a layer whose kernel is smaller than its input is computed. Direct reads the taps in
+    // place and is the fastest; the matrix product unfolds the patches first and gives the same
+    // bits; the sliding windows are the plain loops, summed plane by plane, and differ from the
+    // other two only in rounding.
+    enum class Path { Direct, MatrixProduct, SlidingWindow };
+    void setPath(Path path) { path_ = path; }
+    Path getPath() const { return path_; }
+
     // A kernel that covers the whole input: one dot product per sample and filter.
     void calculateLayerAsScalarProduct(const Blob& input);
-    // The plain loops, plane by plane: each input plane through its kernel, added up. Kept
-    // as the reference the matrix product is checked against.
     void calculateLayerBySlidingWindow(const Blob& input, const LQ::Size& inputSize,
                                        const LQ::Size& outputSize, const LQ::Size& filterSize);
-    // The same sums as one matrix product per sample: patches unfolded into columns, the
-    // filters packed into panels.
     void calculateLayerByMatrixProduct(const Blob& input, const LQ::Size& inputSize,
                                        const LQ::Size& outputSize, const LQ::Size& filterSize);
-    // forward through the sliding windows instead of the matrix product
-    void setReferencePath(bool reference) { referencePath_ = reference; }
+    // input without its border: the border is added while the input is split by phase
+    void calculateLayerDirectly(const Blob& input, const LQ::Size& outputSize, const LQ::Size& filterSize);
 
     const Blob& getFilter() const { return filter_; }
     const Blob& getBias() const { return bias_; }
@@ -65,9 +70,18 @@ private:
     int filterVolume_ = 0;
     bool doRelu_ = false;
 
-    bool referencePath_ = false;
+    Path path_ = Path::Direct;
     // scratch kept between calls so that a frame allocates nothing
     std::vector<float> plane_;
     std::vector<float> columns_;
     std::vector<float> packed_;
+    // the direct path's weights packed by groups, and what they were packed from
+    std::vector<float> groups_;
+    std::vector<float> packedFrom_;
+    std::vector<bool> packedPruned_;
+    std::vector<float> phases_;
+    std::vector<float> wide_;
+    // where the taps start, for the input shape and stride in offsetsFor_
+    std::vector<int> offsets_;
+    std::array<int, 6> offsetsFor_ = {};
 };
