@@ -17,19 +17,6 @@
 
 namespace {
 
-LQ::Image patch(LQ::BaseSize<int> size) {
-    std::mt19937 random(3);
-    LQ::Image image(size, LQ::COLOR_MODE_MONO);
-    for (int y = 0; y < size.height; ++y)
-        for (int x = 0; x < size.width; ++x) image.pixel(x, y)[0] = static_cast<unsigned char>(random() % 256);
-    return image;
-}
-
-NnDetector network(bool large) {
-    return large ? palmNetwork("palm_verifier_iter_140000", kPalm50x60, LQ::BaseSize<int>(50, 60), 1)
-                 : palmNetwork("palm_verifier__iter_250000", kPalm35x33, LQ::BaseSize<int>(35, 33), 1);
-}
-
 torch::Tensor tensorOf(const Blob& blob, std::vector<int64_t> shape) {
     return torch::from_blob(const_cast<float*>(blob.data()), shape, torch::kFloat32).clone();
 }
@@ -71,9 +58,9 @@ torch::Tensor input(const LQ::Image& image) {
 void BM_PalmNetworkLibtorch(benchmark::State& state) {
     const bool large = state.range(0) != 0;
     torch::set_num_threads(1);
-    NnDetector net = network(large);
+    NnDetector net = palmVerifier(large, 1);
     torch::nn::Sequential reference = torchNetwork(net);
-    const LQ::Image image = patch(net.getSize());
+    const LQ::Image image = randomPatch(net.getSize(), 3);
     torch::NoGradGuard noGrad;
     {
         const Blob& ours = net.detect(image);

@@ -52,3 +52,16 @@ NnDetector palmNetwork(const std::string& name, const std::vector<ConvShape>& sh
     net.setSize(size);
     return net;
 }
+
+NnDetector palmVerifier(bool large, unsigned int seed) {
+    return large ? palmNetwork("palm_verifier_iter_140000", kPalm50x60, LQ::BaseSize<int>(50, 60), seed)
+                 : palmNetwork("palm_verifier__iter_250000", kPalm35x33, LQ::BaseSize<int>(35, 33), seed);
+}
+
+LQ::Image randomPatch(LQ::BaseSize<int> size, unsigned int seed) {
+    std::mt19937 random(seed);
+    LQ::Image image(size, LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < size.height; ++y)
+        for (int x = 0; x < size.width; ++x) image.pixel(x, y)[0] = static_cast<unsigned char>(random() % 256);
+    return image;
+}

@@ -24,3 +24,9 @@ Blob randomBlob(std::mt19937& random, int n, int c, int h, int w, float scale);
 // the filter volume
 NnDetector palmNetwork(const std::string& name, const std::vector<ConvShape>& shape, LQ::BaseSize<int> size,
                        unsigned int seed);
+
+// one of the two palm verifiers by its name and input size, the 50 x 60 one if large
+NnDetector palmVerifier(bool large, unsigned int seed);
+
+// a mono patch of uniform random pixels
+LQ::Image randomPatch(LQ::BaseSize<int> size, unsigned int seed);
