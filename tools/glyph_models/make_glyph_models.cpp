@@ -2,7 +2,8 @@
 //
 // Writes the glyph stand-in models into DIR and DIR/sample.y4m, a 1280x720 clip in which
 // the F glyph enters, crosses the frame and leaves, drawn upright for the device's
-// orientation as the engine turns it. Until trained tables land this is what the sample
+// orientation as the engine turns it, with DIR/sample.jsonl: per frame the "fist" and the
+// camera box of its window, or null. Until trained tables land this is what the sample
 // run detects, as mode "fist".
 
 #include <sys/stat.h>
@@ -27,10 +28,11 @@ int turnsOf(int orientation, bool frontCamera) {
     return frontCamera ? t : (4 - t) % 4;
 }
 
-void writeY4m(const std::string& path, int turns, int frames) {
+void writeY4m(const std::string& path, const std::string& truthPath, int turns, int frames) {
     using glyphModels::kCameraHeight;
     using glyphModels::kCameraWidth;
     std::ofstream out(path, std::ios::binary);
+    std::ofstream truth(truthPath);
     out << "YUV4MPEG2 W" << kCameraWidth << " H" << kCameraHeight << " F30:1 Ip A1:1 C420jpeg\n";
     const int luma = kCameraWidth * kCameraHeight, chroma = luma / 4;
     std::string u(chroma, '\0'), v(chroma, '\0');
@@ -39,9 +41,17 @@ void writeY4m(const std::string& path, int turns, int frames) {
     for (int n = 0; n < frames; ++n) {
         glyphModels::Frame frame(turns);
         const int enter = frames / 8, leave = frames - frames / 8;
+        truth << "{\"frame\":" << n << ",\"gesture\":";
         if (n >= enter && n < leave) {
             const float t = static_cast<float>(n - enter) / (leave - enter);
-            frame.draw(glyphs::kF, 0.15f * across + t * 0.35f * across, 0.3f * down + t * 0.2f * down, 2.f);
+            const float left = 0.15f * across + t * 0.35f * across, top = 0.3f * down + t * 0.2f * down;
+            const float size = 2.f * glyphs::kWindow;
+            frame.draw(glyphs::kF, left, top, 2.f);
+            const LQ::BaseRect<float> box = frame.cameraBox(LQ::BaseRect<float>(left, top, left + size, top + size));
+            truth << "\"fist\",\"rect\":[" << box.left << "," << box.top << "," << box.right << "," << box.bottom
+                  << "],\"angle\":0,\"side\":\"RIGHT\"}\n";
+        } else {
+            truth << "null}\n";
         }
         const std::vector<unsigned char>& nv21 = frame.nv21();
         for (int i = 0; i < chroma; ++i) {
@@ -52,7 +62,7 @@ void writeY4m(const std::string& path, int turns, int frames) {
         out.write(reinterpret_cast<const char*>(nv21.data()), luma);
         out << u << v;
     }
-    if (!out) throw std::runtime_error("cannot write " + path);
+    if (!out || !truth) throw std::runtime_error("cannot write " + path + " or " + truthPath);
 }
 
 }  // namespace
@@ -79,7 +89,7 @@ int main(int argc, char** argv) {
         if (i == directory.size() || directory[i] == '/') mkdir(directory.substr(0, i).c_str(), 0777);
     try {
         glyphModels::write(directory);
-        writeY4m(directory + "/sample.y4m", turnsOf(orientation, front), frames);
+        writeY4m(directory + "/sample.y4m", directory + "/sample.jsonl", turnsOf(orientation, front), frames);
     } catch (const std::exception& error) {
         std::cerr << "make_glyph_models: " << error.what() << "\n";
         return 2;
