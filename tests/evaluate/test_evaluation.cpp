@@ -58,9 +58,16 @@ TEST(Evaluation, ReadsTruthLinesAndNamesTheBadOne) {
     std::istringstream good(
         "{\"frame\":0,\"gesture\":null}\n"
         "{\"frame\":1,\"gesture\":\"thumbUp\",\"rect\":[1.5, 2,3,4],\"angle\":-30,\"side\":\"LEFT\"}\n\n"
-        "{\"frame\":2}\n");
+        "{\"frame\":2}\n"
+        "{\"frame\":3,\"gestures\":[{\"gesture\":\"fist\",\"rect\":[5,6,7,8],\"angle\":2,\"side\":\"RIGHT\"}]}\n"
+        "{\"frame\":4,\"gestures\":[{\"gesture\":\"none\",\"rect\":[5,6,7,8]}]}\n"
+        "{\"frame\":5,\"gestures\":[]}\n");
     const std::vector<TruthFrame> frames = evaluation::readTruth(good);
-    ASSERT_EQ(frames.size(), 3u);
+    ASSERT_EQ(frames.size(), 6u);
+    EXPECT_EQ(frames[3].gesture, "fist");
+    EXPECT_EQ(frames[3].rect, (evaluation::Rect{5, 6, 7, 8}));
+    EXPECT_EQ(frames[4].gesture, "");
+    EXPECT_EQ(frames[5].gesture, "");
     EXPECT_EQ(frames[0].gesture, "");
     EXPECT_EQ(frames[1].gesture, "thumbUp");
     EXPECT_EQ(frames[1].rect, (evaluation::Rect{1.5f, 2, 3, 4}));

@@ -56,6 +56,7 @@ std::vector<TruthFrame> readTruth(std::istream& lines) {
                 throw std::runtime_error("frames out of order");
             TruthFrame truth;
             truth.gesture = stringAt(line, valueAt(line, "gesture"));
+            if (truth.gesture == "none") truth.gesture.clear();
             if (!truth.gesture.empty()) {
                 size_t at = valueAt(line, "rect");
                 if (at == std::string::npos || line[at] != '[') throw std::runtime_error("no \"rect\"");

@@ -29,9 +29,11 @@ struct Report {
     Rect rect{};
 };
 
-// One line per frame: {"frame":N,"gesture":"fist","rect":[l,t,r,b],"angle":A,"side":"RIGHT"};
-// "gesture" null or missing means nothing in view. Frames come in order from 0; a line
-// that can't be read throws std::runtime_error naming its number.
+// One line per frame in the host program's own form, {"frame":N,"gestures":[{"gesture":
+// "fist","rect":[l,t,r,b],"angle":A,"side":"RIGHT"}]}, of which the first gesture counts,
+// or flat, {"frame":N,"gesture":"fist","rect":...}. An empty list, a missing or null
+// gesture, or "none" means no gesture in view. Frames come in order from 0; a line that
+// can't be read throws std::runtime_error naming its number.
 std::vector<TruthFrame> readTruth(std::istream& lines);
 
 struct Summary {

@@ -2,8 +2,8 @@
 //
 // Writes the glyph stand-in models into DIR and DIR/sample.y4m, a 1280x720 clip in which
 // the F glyph enters, crosses the frame and leaves, drawn upright for the device's
-// orientation as the engine turns it, with DIR/sample.jsonl: per frame the "fist" and the
-// camera box of its window, or null. Until trained tables land this is what the sample
+// orientation as the engine turns it, with DIR/sample.jsonl: per frame, in the host
+// program's form, the "fist" and the camera box of its window, or an empty list. Until trained tables land this is what the sample
 // run detects, as mode "fist".
 
 #include <sys/stat.h>
@@ -41,18 +41,17 @@ void writeY4m(const std::string& path, const std::string& truthPath, int turns, 
     for (int n = 0; n < frames; ++n) {
         glyphModels::Frame frame(turns);
         const int enter = frames / 8, leave = frames - frames / 8;
-        truth << "{\"frame\":" << n << ",\"gesture\":";
+        truth << "{\"frame\":" << n << ",\"gestures\":[";
         if (n >= enter && n < leave) {
             const float t = static_cast<float>(n - enter) / (leave - enter);
             const float left = 0.15f * across + t * 0.35f * across, top = 0.3f * down + t * 0.2f * down;
             const float size = 2.f * glyphs::kWindow;
             frame.draw(glyphs::kF, left, top, 2.f);
             const LQ::BaseRect<float> box = frame.cameraBox(LQ::BaseRect<float>(left, top, left + size, top + size));
-            truth << "\"fist\",\"rect\":[" << box.left << "," << box.top << "," << box.right << "," << box.bottom
-                  << "],\"angle\":0,\"side\":\"RIGHT\"}\n";
-        } else {
-            truth << "null}\n";
+            truth << "{\"gesture\":\"fist\",\"rect\":[" << box.left << "," << box.top << "," << box.right << ","
+                  << box.bottom << "],\"angle\":0,\"side\":\"RIGHT\"}";
         }
+        truth << "]}\n";
         const std::vector<unsigned char>& nv21 = frame.nv21();
         for (int i = 0; i < chroma; ++i) {
             v[i] = static_cast<char>(nv21[luma + 2 * i]);
