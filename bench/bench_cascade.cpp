@@ -10,6 +10,7 @@
 #include <climits>
 #include <cmath>
 #include <fstream>
+#include <map>
 #include <memory>
 #include <random>
 #include <vector>
@@ -161,13 +162,37 @@ struct Fixture {
             cascades.back()->flipVertically();
         }
         for (auto& c : cascades) list.push_back(c.get());
+        detector = makeDetector(list);
+    }
+
+    std::unique_ptr<AdaBoostDetector> makeDetector(const std::vector<CascadedClassifier*>& list) const {
         const LQ::DetectRegion region(LQ::BaseRect<int>(0, 0, kWidth, kHeight), LQ::BaseRange<float>(28, 1000),
                                       LQ::AngleRange(), LQ::Side::BOTH);
-        detector.reset(new AdaBoostDetector(list, pyramid, AdaBoostDetector::StoreTarget::CHILD_STATES,
-                                            new LQ::DetectRegionSetter(region), 2, 3, 0.3f,
-                                            LQ::SharedPtr<LQ::BaseDetector>(), LQ::SharedPtr<LQ::BaseDetector>(),
-                                            LQ::SharedPtr<LQ::BaseDetector>(),
-                                            LQ::RelativeLocation(1, LQ::BasePoint<float>(0, 0), 0, 0, 0), 1000));
+        return std::unique_ptr<AdaBoostDetector>(new AdaBoostDetector(
+            list, pyramid, AdaBoostDetector::StoreTarget::CHILD_STATES, new LQ::DetectRegionSetter(region), 2, 3, 0.3f,
+            LQ::SharedPtr<LQ::BaseDetector>(), LQ::SharedPtr<LQ::BaseDetector>(), LQ::SharedPtr<LQ::BaseDetector>(),
+            LQ::RelativeLocation(1, LQ::BasePoint<float>(0, 0), 0, 0, 0), 1000));
+    }
+
+    // The same cascades cut after their first stages, the last of them refusing every window.
+    struct Cut {
+        std::vector<std::unique_ptr<CascadedClassifier>> cascades;
+        std::unique_ptr<AdaBoostDetector> detector;
+    };
+    std::map<int, Cut> cuts;
+    AdaBoostDetector& cutAfter(int stages) {
+        Cut& cut = cuts[stages];
+        if (cut.detector) return *cut.detector;
+        std::vector<CascadedClassifier*> list;
+        for (const auto& whole : cascades) {
+            cut.cascades.emplace_back(new CascadedClassifier(*whole));
+            CascadedClassifier& c = *cut.cascades.back();
+            c.stages().resize(std::min(c.stages().size(), static_cast<size_t>(stages)));
+            c.setLastStageThreshold(INT_MAX);
+            list.push_back(&c);
+        }
+        cut.detector = makeDetector(list);
+        return *cut.detector;
     }
 
     // windows the detector's layers hold at its step
@@ -222,6 +247,20 @@ void BM_TriggerScanFeaturesCached(benchmark::State& state) {
     state.counters["windows/s"] = benchmark::Counter(f.windows(), benchmark::Counter::kIsIterationInvariantRate);
 }
 BENCHMARK(BM_TriggerScanFeaturesCached)->Unit(benchmark::kMicrosecond);
+
+// The scan with the cascades cut after k stages: the step from k - 1 to k is what stage k
+// costs, with the windows that reach it.
+void BM_TriggerScanToStage(benchmark::State& state) {
+    Fixture& f = fixture();
+    size_t found = 0;
+    f.frame(true, found);
+    AdaBoostDetector& detector = f.cutAfter(static_cast<int>(state.range(0)));
+    for (auto _ : state) {
+        LQ::SharedPtr<LQ::StateAggregator> aggregator = LQ::StateAggregator::newDetectorState();
+        detector.detect(aggregator);
+    }
+}
+BENCHMARK(BM_TriggerScanToStage)->DenseRange(1, 4)->Unit(benchmark::kMicrosecond);
 
 #if defined(TACTUS_WITH_OPENCV_OBJDETECT)
 void BM_OpenCvLbpFaceCascade(benchmark::State& state) {

@@ -153,8 +153,9 @@ using LQ::sobelRowNeon;
 #endif
 #if !defined(LQ_HAVE_SSSE3)
 const std::nullptr_t rmctRowSse = nullptr, rmctRowAvx2 = nullptr, integralRowSse = nullptr, integralRowAvx2 = nullptr,
-                     integralHogRowSse = nullptr, sobelRowSse = nullptr;
+                     integralHogRowSse = nullptr, integralHogRowAvx2 = nullptr, sobelRowSse = nullptr;
 #else
+using LQ::integralHogRowAvx2;
 using LQ::integralHogRowSse;
 using LQ::integralRowAvx2;
 using LQ::integralRowSse;
@@ -189,7 +190,7 @@ TEST(FeatureRows, VectorRowsEqualScalarRows) {
                 });
     using Hog = decltype(&LQ::integralHogRowScalar);
     for (int bins : {6, 12})
-        compareRows(variants<Hog>(LQ::integralHogRowScalar, integralHogRowNeon, integralHogRowSse, nullptr), 3,
+        compareRows(variants<Hog>(LQ::integralHogRowScalar, integralHogRowNeon, integralHogRowSse, integralHogRowAvx2), 3,
                     [bins](Hog f, const std::vector<unsigned char>* rows, int width) {
                         const unsigned char* table = bins == 12 ? LQ::getHogSigned12() : LQ::getHogUnsigned6();
                         std::vector<unsigned int> previous((width + 1) * (bins + 1)), out(previous.size(), 7);

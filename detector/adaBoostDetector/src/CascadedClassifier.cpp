@@ -199,6 +199,40 @@ bool CascadedClassifier::passesFrom(int first, const unsigned char* r, const uns
     return true;
 }
 
+namespace {
+bool censusOnly(const StrongClassifier& stage) {
+    return stage.haarClassifiers().empty() && stage.hogClassifiers().empty();
+}
+
+// Keeps those of list[0, n) whose stage sum reaches the stage's threshold, in order, with
+// that sum; returns how many. pointers(window, rmct, hog, integral) finds a window's data.
+// Four windows at a time, the last group filled up with the last window.
+template <class Survivor, class Pointers>
+int keepPassing(const StrongClassifier& stage, Survivor* list, int n, const Pointers& pointers) {
+    const int threshold = stage.getThreshold();
+    int kept = 0;
+    for (int c = 0; c < n; c += 4) {
+        const unsigned char* rmct[4];
+        const unsigned int* hog[4];
+        const unsigned int* integral[4];
+        Survivor group[4];
+        for (int j = 0; j < 4; ++j) {
+            group[j] = list[std::min(c + j, n - 1)];
+            pointers(group[j], rmct[j], hog[j], integral[j]);
+        }
+        int sums[4];
+        stage.totalScores(rmct, hog, integral, sums);
+        // written behind the reading position: kept never passes c
+        for (int j = 0; j < 4 && c + j < n; ++j) {
+            list[kept] = group[j];
+            list[kept].score = sums[j];
+            kept += sums[j] >= threshold;
+        }
+    }
+    return kept;
+}
+}  // namespace
+
 void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image& mono,
                                           const LQ::Image& integralImage, std::vector<AdaObject>& objects,
                                           const LQ::BaseRect<int>& rect, int bucket, int step) {
@@ -209,45 +243,82 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
     const size_t monoStride = mono.stripLength();
     const size_t integralStride = integralImage.stripLength() / sizeof(unsigned int);
     const unsigned int* integral = reinterpret_cast<const unsigned int*>(integralImage.data());
-    const StrongClassifier::RmctTest* testsBegin = firstStage_->packedBegin();
-    const StrongClassifier::RmctTest* testsEnd = firstStage_->packedEnd();
-    const int threshold = firstThreshold_;
-    const bool inlineFirst = firstStageFlag_;
-    const int start = startStage_;
+    const unsigned char* rmctEnd = rmct.row(rmct.height() - 1) + rmct.width();
+    const StrongClassifier::RmctTest* tests = firstStage_->packedBegin();
+    const int testCount = static_cast<int>(firstStage_->packedEnd() - tests);
+    const int stages = static_cast<int>(strongClassifiers.size());
+    // Census stages go on right after the first, over one row's survivors while its census
+    // rows are at hand; the rest run over the survivors of the whole layer, stage by stage.
+    int rowStages = startStage_;
+    while (rowStages < stages && censusOnly(strongClassifiers[rowStages])) ++rowStages;
+    const int count = (rect.right - rect.left) / step + 1;
+    const size_t windows = static_cast<size_t>(count) * ((rect.bottom - rect.top) / step + 1);
+    if (static_cast<int>(passed_.size()) < count) {
+        passed_.resize(count);
+        passedScores_.resize(count);
+    }
+    if (survivors_.size() < windows) survivors_.resize(windows);
+    int* passed = passed_.data();
+    int* scores = passedScores_.data();
+    Survivor* list = survivors_.data();
+    const auto plain = [&](const Survivor& w, const unsigned char*& r, const unsigned int*& h,
+                           const unsigned int*& i) {
+        r = rmct.data() + w.y * rmctStride + w.x;
+        h = nullptr;
+        i = integral + pShift[w.y] * integralStride + pShift[w.x];
+    };
 
+    int listed = 0;
     for (int y = rect.top; y <= rect.bottom; y += step) {
         const unsigned char* rmctRow = rmct.data() + y * rmctStride;
-        const unsigned char* monoRow = mono.data() + y * monoStride;
-        const unsigned int* integralRow = integral + pShift[y] * integralStride;
-        // the rest of the stages for a window, its first-stage sum in score
-        const auto rest = [&](int x, int score) {
-            if (passesFrom(start, rmctRow + x, monoRow + x, integralRow + pShift[x], x, y, score))
-                appendObject(objects, x, y, score);
-        };
-        int x = rect.left;
-        if (inlineFirst) {
-            // two windows at a time: their look-ups don't wait for each other
-            for (; x + step <= rect.right; x += 2 * step) {
-                const unsigned char* a = rmctRow + x;
-                const unsigned char* b = a + step;
-                int sumA = 0, sumB = 0;
-                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) {
-                    sumA += t->table[a[t->offset]];
-                    sumB += t->table[b[t->offset]];
-                }
-                if (sumA >= threshold) rest(x, sumA);
-                if (sumB >= threshold) rest(x + step, sumB);
-            }
-            for (; x <= rect.right; x += step) {
-                const unsigned char* a = rmctRow + x;
-                int sum = 0;
-                for (const StrongClassifier::RmctTest* t = testsBegin; t < testsEnd; ++t) sum += t->table[a[t->offset]];
-                if (sum >= threshold) rest(x, sum);
-            }
+        int n = count;
+        if (firstStageFlag_) {
+            n = firstStagePasses(rmctRow + rect.left, rmctEnd, step, count, tests, testCount, firstThreshold_,
+                                 passed, scores);
         } else {
-            for (; x <= rect.right; x += step) rest(x, 0);
+            for (int k = 0; k < count; ++k) passed[k] = k;
+            std::fill(scores, scores + count, 0);
+        }
+        Survivor* row = list + listed;
+        for (int c = 0; c < n; ++c) row[c] = Survivor{rect.left + passed[c] * step, y, scores[c]};
+        for (int s = startStage_; s < rowStages && n > 0; ++s) n = keepPassing(strongClassifiers[s], row, n, plain);
+        listed += n;
+    }
+
+    int s = rowStages;
+    for (; s < std::min(stages, firstHogStage_) && listed > 0; ++s)
+        listed = keepPassing(strongClassifiers[s], list, listed, plain);
+    if (s < stages && listed > 0) {
+        // HOG stages: from the layer's integral HOG where it holds every survivor, else
+        // window by window, each with its own
+        bool shared = layerHog_ != nullptr;
+        for (int c = 0; c < listed && shared; ++c)
+            shared = layerHog_->rect.contains(LQ::BaseRect<int>(list[c].x + hogRoi_.left, list[c].y + hogRoi_.top,
+                                                                list[c].x + hogRoi_.right, list[c].y + hogRoi_.bottom));
+        if (shared) {
+            const unsigned int* hog = windowHog(mono.data() + list[0].y * monoStride + list[0].x, list[0].x, list[0].y);
+            const size_t width = static_cast<size_t>(layerHog_->rect.width()) + 1;
+            const int left = list[0].x, top = list[0].y;
+            const auto withHog = [&](const Survivor& w, const unsigned char*& r, const unsigned int*& h,
+                                     const unsigned int*& i) {
+                plain(w, r, h, i);
+                h = hog + (static_cast<ptrdiff_t>(w.y - top) * static_cast<ptrdiff_t>(width) + (w.x - left)) * 7;
+            };
+            for (; s < stages && listed > 0; ++s) listed = keepPassing(strongClassifiers[s], list, listed, withHog);
+        } else {
+            int kept = 0;
+            for (int c = 0; c < listed; ++c) {
+                Survivor w = list[c];
+                const unsigned char* r;
+                const unsigned int *h, *i;
+                plain(w, r, h, i);
+                if (!passesFrom(s, r, mono.data() + w.y * monoStride + w.x, i, w.x, w.y, w.score)) continue;
+                list[kept++] = w;
+            }
+            listed = kept;
         }
     }
+    for (int c = 0; c < listed; ++c) appendObject(objects, list[c].x, list[c].y, list[c].score);
 }
 
 void CascadedClassifier::addMatchesDynamic(const LQ::Image& rmct, const LQ::Image& mono,

@@ -1,6 +1,7 @@
 #pragma once
 // A series of stages over a window of fixed size, and the integer scan of one pyramid
-// layer. Almost every window ends in the first stage, which the scan evaluates inline.
+// layer. Almost every window ends in the first stage, which the scan evaluates for a row of
+// windows at once; the few that pass go on through the later stages in lists.
 
 #include <istream>
 #include <map>
@@ -115,4 +116,12 @@ private:
     LayerHog* layerHog_ = nullptr;
     // row length the HOG offsets are made for at present
     int hogRowLength_ = 0;
+    // a window still in the race, at its position in the layer, and its last stage sum
+    struct Survivor {
+        int x, y, score;
+    };
+    // the scan's working lists, sized by the largest layer so far: the first stage's
+    // survivors of one row, and those of the whole layer in scan order
+    std::vector<int> passed_, passedScores_;
+    std::vector<Survivor> survivors_;
 };

@@ -36,7 +36,52 @@ StrongClassifier& StrongClassifier::operator=(const StrongClassifier& other) {
         hogBegin_ = hog_.data();
         hogEnd_ = hog_.data() + hog_.size();
     }
+    packHaar();
+    packHog();
     return *this;
+}
+
+void StrongClassifier::packHaar() {
+    haarTests_.resize(static_cast<size_t>(haarEnd_ - haarBegin_));
+    for (size_t k = 0; k < haarTests_.size(); ++k) {
+        const WeakClassifierHaar& h = haarBegin_[k];
+        HaarTest& t = haarTests_[k];
+        const int first = static_cast<int>(h.firstOffset), second = static_cast<int>(h.secondOffset);
+        const int firstDown = static_cast<int>(h.firstHeightStep), secondDown = static_cast<int>(h.secondHeightStep);
+        const int corners[8] = {first,
+                                first + h.firstWidth,
+                                first + firstDown,
+                                first + firstDown + h.firstWidth,
+                                second,
+                                second + h.secondWidth,
+                                second + secondDown,
+                                second + secondDown + h.secondWidth};
+        std::copy(corners, corners + 8, t.corner);
+        t.first = h.firstFactor;
+        t.second = h.secondFactor;
+        t.reciprocal = h.reciprocal;
+        t.table = h.divisor ? h.table + 127 : h.table;
+        t.source = &h;
+    }
+    haarTestsBegin_ = haarTests_.data();
+    haarTestsEnd_ = haarTestsBegin_ + haarTests_.size();
+}
+
+void StrongClassifier::packHog() {
+    hogTests_.resize(static_cast<size_t>(hogEnd_ - hogBegin_));
+    for (size_t k = 0; k < hogTests_.size(); ++k) {
+        const WeakClassifierHog& g = hogBegin_[k];
+        HogTest& t = hogTests_[k];
+        const int cell[4] = {g.cellOffset + g.sector, g.cellOffset + g.cellEnd, g.cellOffset + g.cellHeightStep + g.sector,
+                             g.cellOffset + g.cellHeightStep + g.cellEnd};
+        const int block[4] = {g.blockOffset + 6, g.blockOffset + g.blockEnd, g.blockOffset + g.blockHeightStep + 6,
+                              g.blockOffset + g.blockHeightStep + g.blockEnd};
+        std::copy(cell, cell + 4, t.cell);
+        std::copy(block, block + 4, t.block);
+        t.table = g.table;
+    }
+    hogTestsBegin_ = hogTests_.data();
+    hogTestsEnd_ = hogTestsBegin_ + hogTests_.size();
 }
 
 void StrongClassifier::addHogClassifier(const WeakClassifierHog& hogClassifier) {
@@ -50,6 +95,10 @@ void StrongClassifier::clearActive() {
     haarBegin_ = haarEnd_ = nullptr;
     hogBegin_ = hogEnd_ = nullptr;
     activeBucket_ = -1;
+    haarTests_.clear();
+    hogTests_.clear();
+    haarTestsBegin_ = haarTestsEnd_ = nullptr;
+    hogTestsBegin_ = hogTestsEnd_ = nullptr;
 }
 
 void StrongClassifier::reset() {
@@ -102,6 +151,9 @@ void StrongClassifier::activate(int rmctStride, int integralStride, float scale)
         hogBegin_ = hog_.data();
         hogEnd_ = hog_.data() + hog_.size();
     }
+    packHaar();
+    // the HOG offsets change with the row length only, which repacks them
+    if (hogTestsBegin_ == nullptr || hogTests_.size() != hog_.size()) packHog();
 }
 
 void StrongClassifier::rotate(const LQ::BaseSize<int>& size) {
@@ -134,10 +186,12 @@ LQ::BaseRect<int> StrongClassifier::calculateHogRoi() const {
 
 void StrongClassifier::moveHogRoi(const LQ::BaseRect<int>& roi) {
     for (WeakClassifierHog& classifier : hog_) classifier.moveRoi(roi);
+    if (hogBegin_) packHog();
 }
 
 void StrongClassifier::setHogRowLength(int rowLength) {
     for (WeakClassifierHog& classifier : hog_) classifier.setRowLength(rowLength);
+    packHog();
 }
 
 namespace {

@@ -166,9 +166,19 @@ void WeakClassifierHaar::set() {
         secondFactor = -1;
         divisor = 2 * a1;
     }
+    reciprocal = divisor ? 1.0 / static_cast<double>(divisor) * (1.0 + 0x1p-46) : 0.0;
     firstWidth = static_cast<uint16_t>(allRect.width());
     secondWidth = static_cast<uint16_t>(posRect.width());
     setStripLength(stripLength);
+}
+
+int WeakClassifierHaar::dividedIndex(const unsigned int* i) const {
+    if (divisor == 0) return 0;
+    const int s1 = static_cast<int>(i[firstOffset + firstHeightStep + firstWidth] + i[firstOffset] -
+                                    i[firstOffset + firstHeightStep] - i[firstOffset + firstWidth]);
+    const int s2 = static_cast<int>(i[secondOffset + secondHeightStep + secondWidth] + i[secondOffset] -
+                                    i[secondOffset + secondHeightStep] - i[secondOffset + secondWidth]);
+    return 127 + static_cast<int>((firstFactor * s2 - secondFactor * s1) / divisor);
 }
 
 void WeakClassifierHaar::setStripLength(unsigned int stride) {

@@ -369,6 +369,53 @@ void hogRowSse(const unsigned char* up, const unsigned char* mid, const unsigned
 }  // namespace
 #endif
 
+#if defined(LQ_HAVE_SSSE3)
+namespace {
+// A pixel's contribution to all channels at once: the lane mask of its bin, which holds the
+// total's lane too, and-ed with its magnitude. With eight lanes the six-bin sums and their
+// total take one register, and the running sums never leave it.
+template <int Bins>
+__attribute__((target("avx2"))) void hogRowAvx2(const unsigned char* up, const unsigned char* mid,
+                                                const unsigned char* down, int width, const unsigned char* hog,
+                                                const unsigned int* previous, unsigned int* current) {
+    constexpr int channels = Bins + 1, vectors = (channels + 7) / 8;
+    const unsigned char* magnitudes = getMagnitudes();
+    alignas(32) unsigned int masks[Bins][8 * vectors] = {};
+    for (int b = 0; b < Bins; ++b) {
+        masks[b][b] = ~0u;
+        masks[b][Bins] = ~0u;
+    }
+    __m256i accumulator[vectors];
+    for (int v = 0; v < vectors; ++v) accumulator[v] = _mm256_setzero_si256();
+    const unsigned int* above = previous + 2 * channels;
+    unsigned int* out = current + 2 * channels;
+    const auto add = [&](int entry) __attribute__((target("avx2"))) {
+        const __m256i m = _mm256_set1_epi32(magnitudes[entry]);
+        const unsigned int* mask = masks[hog[entry]];
+        for (int v = 0; v < vectors; ++v) {
+            const __m256i lanes = _mm256_load_si256(reinterpret_cast<const __m256i*>(mask + 8 * v));
+            accumulator[v] = _mm256_add_epi32(accumulator[v], _mm256_and_si256(lanes, m));
+            const __m256i sum =
+                _mm256_add_epi32(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(above + 8 * v)), accumulator[v]);
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(out + 8 * v), sum);
+        }
+        above += channels;
+        out += channels;
+    };
+    int i = 1;
+    int entries[8];
+    for (; i + 9 <= width; i += 8) {
+        hogEntries8Sse(up, mid, down, i, entries);
+        for (int e = 0; e < 8; ++e) add(entries[e]);
+    }
+    for (; i <= width - 2; ++i) add(hogEntry(up, mid, down, i));
+    alignas(32) unsigned int last[8 * vectors];
+    for (int v = 0; v < vectors; ++v) _mm256_store_si256(reinterpret_cast<__m256i*>(last + 8 * v), accumulator[v]);
+    for (int k = 0; k < channels; ++k) out[k] = above[k] + last[k];
+}
+}  // namespace
+#endif
+
 void integralHogRowScalar(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
                           const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
     if (bins == 12)
@@ -397,13 +444,26 @@ void integralHogRowSse(const unsigned char* above, const unsigned char* centre, 
 }
 #endif
 
+#if defined(LQ_HAVE_SSSE3)
+__attribute__((target("avx2"))) void integralHogRowAvx2(const unsigned char* above, const unsigned char* centre,
+                                                        const unsigned char* below, int width,
+                                                        const unsigned char* hog, int bins,
+                                                        const unsigned int* previous, unsigned int* current) {
+    if (bins == 12)
+        hogRowAvx2<12>(above, centre, below, width, hog, previous, current);
+    else
+        hogRowAvx2<6>(above, centre, below, width, hog, previous, current);
+}
+#endif
+
 namespace {
 void integralHogRow(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
                     const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current) {
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
     integralHogRowNeon(above, centre, below, width, hog, bins, previous, current);
 #elif defined(LQ_HAVE_SSSE3)
-    integralHogRowSse(above, centre, below, width, hog, bins, previous, current);
+    static const auto row = __builtin_cpu_supports("avx2") ? integralHogRowAvx2 : integralHogRowSse;
+    row(above, centre, below, width, hog, bins, previous, current);
 #else
     integralHogRowScalar(above, centre, below, width, hog, bins, previous, current);
 #endif

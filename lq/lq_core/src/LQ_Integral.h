@@ -49,6 +49,9 @@ void integralHogRowNeon(const unsigned char* above, const unsigned char* centre,
 #if defined(LQ_HAVE_SSSE3)
 void integralHogRowSse(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
                        const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current);
+// only where the processor has AVX2
+void integralHogRowAvx2(const unsigned char* above, const unsigned char* centre, const unsigned char* below, int width,
+                        const unsigned char* hog, int bins, const unsigned int* previous, unsigned int* current);
 #endif
 
 // 512 x 512 tables addressed [a + 256][b + 256], built at first use

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <array>
 #include <atomic>
 #include <cstdlib>
 #include <new>
@@ -399,4 +401,179 @@ TEST(CascadeScan, SharedLayerHogEqualsOneHogPerWindow) {
     fromLayer.clear();
     shared.addMatches(f.rmct, mono, f.integral, fromLayer, 1.0f, 1);
     EXPECT_EQ(fromLayer.size(), own.size());
+}
+
+namespace {
+
+// One window's stage sums from the classifiers' own rectangles and points: census bytes,
+// rectangle sums of the integral image with an integer division, and HOG sums of the whole
+// layer's integral HOG. Nothing of the scan's packed forms, lists or vector kernels.
+struct Reference {
+    const Image& rmct;
+    const Image& integral;
+    Image hog;
+    float scale;
+
+    Reference(const Image& rmctImage, const Image& mono, const Image& integralImage, float zoom)
+        : rmct(rmctImage), integral(integralImage), scale(zoom) {
+        LQ::computeIntegralHog(mono, hog, mono.rect(), LQ::COLOR_MODE_INTEGRAL_HOG_UNSIGNED6);
+    }
+
+    unsigned int hogSum(const BaseRect<int>& r, int x, int y, int channel) const {
+        const auto at = [&](int u, int v) {
+            return reinterpret_cast<const unsigned int*>(hog.row(v + y))[(u + x) * 7 + channel];
+        };
+        return at(r.right, r.bottom) + at(r.left, r.top) - at(r.right, r.top) - at(r.left, r.bottom);
+    }
+
+    int stageSum(const StrongClassifier& stage, int x, int y) const {
+        int sum = 0;
+        for (const WeakClassifierRmct& c : stage.rmctClassifiers())
+            sum += c.table[rmct.pixel(x + c.point.x, y + c.point.y)[0]];
+        const int stride = static_cast<int>(integral.stripLength() / 4);
+        const unsigned int* origin = reinterpret_cast<const unsigned int*>(integral.data()) +
+                                     static_cast<int>(y * scale) * stride + static_cast<int>(x * scale);
+        for (const WeakClassifierHaar& h : stage.haarClassifiers()) {
+            WeakClassifierHaar scaled;
+            scaled.resize(h, scale);
+            scaled.setStripLength(stride);
+            sum += h.table[scaled.dividedIndex(origin)];
+        }
+        for (const WeakClassifierHog& g : stage.hogClassifiers()) {
+            const unsigned long long c = hogSum(g.cell, x, y, g.getSector());
+            const unsigned long long b = hogSum(g.block, x, y, 6) + 1u;
+            sum += g.table[(c << 8) / b];
+        }
+        return sum;
+    }
+};
+
+BaseRect<int> randomRect(std::mt19937& random, const BaseRect<int>& inside, int minSide) {
+    const int w = minSide + random() % (inside.width() - minSide + 1);
+    const int h = minSide + random() % (inside.height() - minSide + 1);
+    const int x = inside.left + random() % (inside.width() - w + 1);
+    const int y = inside.top + random() % (inside.height() - h + 1);
+    return BaseRect<int>(x, y, x + w, y + h);
+}
+
+// stage kinds: census count, Haar count, HOG count
+CascadedClassifier randomCascade(std::mt19937& random, const std::vector<std::array<int, 3>>& kinds,
+                                 std::vector<std::vector<LQ::schar>>& tables) {
+    const int W = 13 + random() % 9, H = 12 + random() % 9;
+    CascadedClassifier cascade;
+    cascade.setMonoSize(BaseSize<int>(W, H));
+    cascade.setName("random");
+    const auto table = [&]() {
+        tables.emplace_back(256);
+        for (auto& v : tables.back()) v = static_cast<LQ::schar>(static_cast<int>(random() % 41) - 20);
+        return tables.back().data();
+    };
+    for (const auto& kind : kinds) {
+        StrongClassifier stage;
+        for (int k = 0; k < kind[0]; ++k) {
+            WeakClassifierRmct weak(BasePoint<int>(random() % W, random() % H));
+            weak.setData(table());
+            stage.addRmctClassifier(weak);
+        }
+        for (int k = 0; k < kind[1]; ++k) {
+            WeakClassifierHaar weak;
+            const BaseRect<int> all = randomRect(random, BaseRect<int>(0, 0, W, H), 2);
+            weak.set(all, random() % 5 ? randomRect(random, all, 1) : BaseRect<int>());
+            weak.setData(table());
+            stage.addHaarClassifier(weak);
+        }
+        for (int k = 0; k < kind[2]; ++k) {
+            // blocks one pixel inside the window, as the HOG region needs
+            WeakClassifierHog weak;
+            const BaseRect<int> block = randomRect(random, BaseRect<int>(1, 1, W - 1, H - 1), 3);
+            weak.setBlock(block);
+            weak.setCell(randomRect(random, block, 1));
+            weak.setSector(random() % 6);
+            weak.setData(table());
+            stage.addHogClassifier(weak);
+        }
+        cascade.addStrongClassifier(stage);
+    }
+    return cascade;
+}
+
+}  // namespace
+
+// The scan finds exactly the windows, in the same order and with the same scores, that a
+// window-by-window evaluation from the classifiers' definitions finds: census-only first
+// stages (the vector kernel) and mixed ones, census, Haar and HOG stages after them, one and
+// two HOG stages, steps 1 to 3, zooms 1 and 1.2, odd layer sizes with a wider stride, and the
+// HOG from the layer's shared image or made per window. Thresholds are set from the reference
+// sums so that some windows end at every stage and some pass them all.
+TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
+    const std::vector<std::vector<std::array<int, 3>>> shapes = {
+        {{5, 0, 0}, {12, 0, 0}, {6, 5, 0}, {8, 0, 6}, {0, 3, 4}},
+        {{1, 0, 0}, {3, 4, 0}, {2, 0, 5}},
+        {{4, 3, 0}, {6, 0, 0}, {0, 0, 5}},
+        {{2, 0, 3}, {5, 2, 2}},
+        {{7, 0, 0}},
+    };
+    std::mt19937 random(29);
+    int hits = 0, hogScans = 0;
+    for (size_t shape = 0; shape < shapes.size(); ++shape)
+        for (int step = 1; step <= 3; ++step)
+            for (float zoom : {1.0f, 1.2f}) {
+                std::vector<std::vector<LQ::schar>> tables;
+                CascadedClassifier cascade = randomCascade(random, shapes[shape], tables);
+                const int layerW = 45 + random() % 30, layerH = 38 + random() % 20;
+                Image parent;
+                const Image mono = randomView(layerW, layerH, LQ::COLOR_MODE_MONO, random(), parent);
+                Image rmct, integral;
+                LQ::computeRmct(mono, rmct);
+                LQ::computeIntegral(randomImage(static_cast<int>(layerW * zoom) + 2,
+                                                static_cast<int>(layerH * zoom) + 2, LQ::COLOR_MODE_MONO, random()),
+                                    integral);
+                const Reference reference(rmct, mono, integral, zoom);
+
+                // thresholds: the first stage passes a third of the windows, each later half
+                const BaseSize<int> window = cascade.getMonoSize();
+                std::vector<BasePoint<int>> reached;
+                for (int y = 0; y + window.height <= layerH; y += step)
+                    for (int x = 0; x + window.width <= layerW; x += step) reached.emplace_back(x, y);
+                std::vector<AdaObject> expected;
+                for (size_t s = 0; s < cascade.stages().size(); ++s) {
+                    StrongClassifier& stage = cascade.stages()[s];
+                    std::vector<int> sums;
+                    for (const BasePoint<int>& p : reached) sums.push_back(reference.stageSum(stage, p.x, p.y));
+                    std::vector<int> sorted = sums;
+                    const size_t cut = sorted.size() * (s ? 1 : 2) / (s ? 2 : 3);
+                    std::nth_element(sorted.begin(), sorted.begin() + cut, sorted.end());
+                    stage.setThreshold(sorted[cut]);
+                    std::vector<BasePoint<int>> next;
+                    for (size_t k = 0; k < reached.size(); ++k) {
+                        if (sums[k] < stage.getThreshold()) continue;
+                        next.push_back(reached[k]);
+                        if (s + 1 == cascade.stages().size())
+                            expected.emplace_back("random", window, cascade.getObjectCenter() + reached[k],
+                                                  ClassifierProperties::SIDE_SCORE, 1.f, 0, 1, sums[k]);
+                    }
+                    reached = next;
+                }
+                ASSERT_FALSE(expected.empty());
+                hits += static_cast<int>(expected.size());
+
+                for (bool shared : {false, true}) {
+                    CascadedClassifier scanned = cascade;
+                    LayerHog layerHog;
+                    if (shared) {
+                        layerHog.bind(mono, mono.rect());
+                        scanned.setLayerHog(&layerHog);
+                    }
+                    std::vector<AdaObject> objects;
+                    scanned.addMatches(rmct, mono, integral, objects, zoom, step);
+                    hogScans += shared && layerHog.computed;
+                    ASSERT_EQ(objects.size(), expected.size()) << shape << " " << step << " " << zoom;
+                    for (size_t k = 0; k < objects.size(); ++k) {
+                        ASSERT_EQ(objects[k].center, expected[k].center) << shape << " " << step << " " << k;
+                        ASSERT_EQ(objects[k].score, expected[k].score) << shape << " " << step << " " << k;
+                    }
+                }
+            }
+    EXPECT_GT(hits, 200);
+    EXPECT_EQ(hogScans, 4 * 3 * 2);
 }

@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <climits>
+#include <cstdlib>
+#include <numeric>
 #include <random>
 #include <sstream>
 #include <vector>
@@ -223,6 +226,69 @@ TEST(WeakClassifiers, LookUpIndicesMatchDirectSums) {
     quiet.setCell(BaseRect<int>(2, 2, 5, 5));
     quiet.moveRoi(flat.rect());
     EXPECT_EQ(quiet.index(reinterpret_cast<const unsigned int*>(hogImage.data())), 0);
+}
+
+// The Haar quotient is found by a multiplication; it must be the integer quotient exactly,
+// at exact multiples of the divisor and one step on either side of them, with either sign,
+// for a negative divisor and none, and on both sides of the range where the multiplication
+// is trusted. The two rectangle sums are set directly at their bottom-right corners.
+TEST(WeakClassifiers, HaarQuotientIsExactEverywhere) {
+    const int stride = 160;
+    struct Case {
+        BaseRect<int> first, second;
+    };
+    const Case cases[] = {{BaseRect<int>(1, 1, 38, 30), BaseRect<int>(5, 4, 20, 17)},
+                          {BaseRect<int>(1, 1, 5, 4), BaseRect<int>(2, 2, 4, 3)},
+                          {BaseRect<int>(1, 1, 121, 101), BaseRect<int>(10, 10, 50, 41)},
+                          {BaseRect<int>(3, 3, 7, 7), BaseRect<int>(1, 1, 10, 10)},
+                          {BaseRect<int>(1, 2, 61, 40), BaseRect<int>()},
+                          {BaseRect<int>(2, 2, 9, 8), BaseRect<int>(2, 2, 9, 8)}};
+    std::mt19937 random(17);
+    long long fastChecks = 0, slowChecks = 0;
+    for (const Case& c : cases) {
+        WeakClassifierHaar haar;
+        haar.set(c.first, c.second);
+        haar.setStripLength(stride);
+        std::vector<unsigned int> integral(stride * 130, 0);
+        const size_t firstCorner = c.first.bottom * stride + c.first.right;
+        const size_t secondCorner = c.second.bottom * stride + c.second.right;
+        const auto check = [&](long long s1, long long s2) {
+            if (s1 < INT_MIN || s1 > INT_MAX || s2 < INT_MIN || s2 > INT_MAX) return;
+            // an empty second rectangle has all corners at 0, where the first has none
+            integral[firstCorner] = static_cast<unsigned int>(s1);
+            if (c.second.width()) integral[secondCorner] = static_cast<unsigned int>(s2);
+            const long long sum2 = c.second.width() ? s2 : 0;
+            const long long numerator = haar.firstFactor * sum2 - haar.secondFactor * s1;
+            // quotients far outside any table are left out: 127 + quotient must stay an int
+            if (haar.divisor && std::llabs(numerator / haar.divisor) > (1 << 30)) return;
+            const long long expected = haar.divisor ? 127 + numerator / haar.divisor : 0;
+            ASSERT_EQ(haar.index(integral.data()), expected) << c.first << " " << s1 << " " << s2;
+            ASSERT_EQ(haar.dividedIndex(integral.data()), expected);
+            (std::llabs(numerator) < WeakClassifierHaar::kExactRange ? fastChecks : slowChecks) += 1;
+        };
+        const long long a1 = c.first.area(), a2 = c.second.area();
+        const long long d = haar.divisor ? std::llabs(haar.divisor) : 1;
+        // second sums that make a1 * s2 a multiple of the divisor, times growing factors
+        const long long unit = d / std::gcd(a1, d);
+        for (long long m = 1; m < (1ll << 40); m = m * 3 + 1)
+            for (long long sign : {-1, 1})
+                for (long long delta : {-1, 0, 1})
+                    for (long long s1 = -2; s1 <= 2; ++s1) {
+                        check(s1, sign * m * unit + delta);
+                        if (c.second.width() == 0) check(sign * m * d + delta + s1, 0);
+                    }
+        // numerators just inside and just outside the trusted range
+        const long long factor = c.second.width() ? a1 : 1;
+        for (long long sign : {-1, 1})
+            for (long long delta = -3; delta <= 3; ++delta) {
+                const long long s = sign * (WeakClassifierHaar::kExactRange / factor) + delta;
+                c.second.width() ? check(0, s) : check(-s, 0);
+                c.second.width() ? check(a2 ? 1 : 0, s) : check(-s + 1, 0);
+            }
+        for (int k = 0; k < 20000; ++k) check(static_cast<int>(random()), static_cast<int>(random()));
+    }
+    EXPECT_GT(fastChecks, 10000);
+    EXPECT_GT(slowChecks, 100);
 }
 
 TEST(WeakClassifiers, AbsFeaturePassesTheTablesPassingRange) {
