@@ -1,8 +1,9 @@
 #pragma once
 // The rings the gesture engines ask for by name. Each function builds its ring on the
-// first call and returns the same one ever after. Until trained tables are compiled in,
-// a ring is read from "<name>.ring" in the ring directory; a missing or unreadable file
-// ends in a failed check, and the next call tries again.
+// first call and returns the same one ever after. A file "<name>.ring" in the ring
+// directory wins; without one, the ring's generated tables if they are compiled in
+// (models/rings); with neither, or an unreadable file, the call ends in a failed check and
+// the next call tries again.
 
 #include <string>
 
@@ -11,6 +12,8 @@
 // where the ".ring" files are; empty means the working directory
 void setRingDirectory(const std::string& directory);
 const std::string& ringDirectory();
+// whether the ring of this name has its tables compiled in
+bool hasCompiledRing(const std::string& name);
 
 ClassifierRing* ada_thumbUp_ada__2017_11_13__20_01_17();
 ClassifierRing* ada_mono_ada_staticVictory_2017_11_10__14_34_17();
