@@ -1,0 +1,26 @@
+#!/bin/sh
+# Trains the engine's verifier networks on generated patches, one after another, and
+# writes each as NAME.nn (the palm verifiers also as NAME.cpp) with NAME.log beside it.
+#   models/networks/train.sh [BUILD_DIR] [NAME...]
+# Held-out patches come from another seed and wider ranges of skin, noise, blur and turn.
+set -e
+here=$(cd "$(dirname "$0")" && pwd)
+build=${1:-$here/../../build/release}
+shift || true
+train="$build/tools/nn_train"
+heldout="--heldout-seed 9001 --heldout-set skinTone=0,1 --heldout-set noise=2,9 --heldout-set blur=0,1.0 --heldout-set rotation=-15,15"
+run() {
+    name=$1
+    shift
+    if [ -n "$only" ] && ! echo " $only " | grep -q " $name "; then return; fi
+    nice "$train" --network "$name" --out "$here" --threads 2 $heldout "$@"
+}
+only="$*"
+run palm_verifier__iter_250000 --seed 11 --rate 0.01 --positives 5000 --negatives 10000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 14
+run palm_verifier_iter_140000 --seed 12 --rate 0.01 --positives 3500 --negatives 7000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 12
+run fist_verifier_iter_135000 --seed 13 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 16
+run thumbUp_verifier_iter_55000 --seed 14 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
+run victory_verifier_face_pos_color_2017_12_14__iter_39000 --seed 15 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
+run pointer_verifier__iter_18000 --seed 16 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
+run pointer_hand_side__iter_7500 --seed 17 --positives 6000 --negatives 6000 --heldout-positives 2250 --heldout-negatives 2250 --epochs 10
+run heart_verifier_vent_iter_60000 --seed 18 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10

@@ -1,0 +1,261 @@
+// The verifier trainer: each layer's backward pass against finite differences, a small
+// problem learnt, and trained networks exported and read back through the model reader
+// giving the trainer's scores.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <random>
+#include <sstream>
+
+#include "LQ_ArchiveI.h"
+#include "LQ_ArchiveO.h"
+#include "Trainer.h"
+
+using namespace nntrain;
+
+namespace {
+
+Tensor randomTensor(int n, int c, int h, int w, unsigned seed, float margin = 0) {
+    std::mt19937 random(seed);
+    std::uniform_real_distribution<float> value(-1, 1);
+    Tensor t(n, c, h, w);
+    for (float& x : t.v) {
+        do x = value(random);
+        while (std::fabs(x) < margin);  // keep clear of the kinks of ReLU and PReLU
+    }
+    return t;
+}
+
+// a shuffle of values 0.05 apart
+Tensor spreadTensor(int n, int c, int h, int w, unsigned seed) {
+    Tensor t(n, c, h, w);
+    for (size_t i = 0; i < t.size(); ++i) t.v[i] = 0.05f * static_cast<float>(i) - 1;
+    std::shuffle(t.v.begin(), t.v.end(), std::mt19937(seed));
+    return t;
+}
+
+// L = sum of out * r; checks dL/din and dL/dparams of one layer
+void checkLayer(Layer& layer, Tensor input, unsigned seed) {
+    SCOPED_TRACE(layer.name());
+    Tensor out;
+    layer.forward(input, out);
+    const Tensor r = randomTensor(out.n, out.c, out.h, out.w, seed + 1);
+    auto loss = [&]() {
+        Tensor o;
+        layer.forward(input, o);
+        double sum = 0;
+        for (size_t i = 0; i < o.size(); ++i) sum += double(o.v[i]) * r.v[i];
+        return sum;
+    };
+    for (Param* p : layer.params()) std::fill(p->grad.begin(), p->grad.end(), 0.0f);
+    layer.forward(input, out);
+    Tensor din;
+    layer.backward(input, out, r, &din);
+    const float eps = 1e-2f;
+    auto expectClose = [](double numeric, double analytic, const char* what, size_t i) {
+        EXPECT_NEAR(numeric, analytic, 2e-3 + 2e-3 * std::fabs(analytic)) << what << " " << i;
+    };
+    for (size_t i = 0; i < input.size(); ++i) {
+        const float keep = input.v[i];
+        input.v[i] = keep + eps;
+        const double up = loss();
+        input.v[i] = keep - eps;
+        const double down = loss();
+        input.v[i] = keep;
+        expectClose((up - down) / (2 * eps), din.v[i], "input", i);
+    }
+    for (Param* p : layer.params())
+        for (size_t i = 0; i < p->value.size(); ++i) {
+            const float keep = p->value[i];
+            p->value[i] = keep + eps;
+            const double up = loss();
+            p->value[i] = keep - eps;
+            const double down = loss();
+            p->value[i] = keep;
+            expectClose((up - down) / (2 * eps), p->grad[i], "param", i);
+        }
+}
+
+Blob toBlob(const Tensor& t, int i) {
+    Blob blob(1, t.c, t.h, t.w);
+    std::copy(t.sample(i), t.sample(i) + t.volume(), blob.data());
+    return blob;
+}
+
+}  // namespace
+
+TEST(NnTrain, BackwardPassesMatchFiniteDifferences) {
+    Conv strided("conv", 3, 2, 3, 3, 2, 1);
+    strided.initialise(3);
+    for (size_t i = 0; i < strided.bias.value.size(); ++i) strided.bias.value[i] = 0.1f * float(i);
+    checkLayer(strided, randomTensor(2, 2, 7, 6, 10), 11);
+    Conv wide("conv_2x3", 4, 3, 2, 3);
+    wide.initialise(4);
+    checkLayer(wide, randomTensor(2, 3, 4, 5, 12), 13);
+
+    PRelu prelu("prelu", 3);
+    prelu.slope.value = {0.1f, -0.3f, 0.6f};
+    checkLayer(prelu, randomTensor(2, 3, 3, 4, 14, 0.05f), 15);
+    Relu relu("relu");
+    checkLayer(relu, randomTensor(2, 2, 3, 3, 16, 0.05f), 17);
+
+    // odd sizes: the clipped last windows must route their gradient too; distinct values
+    // far apart, so that no step of the differences changes a window's maximum
+    MaxPool pool("pool", 2, 2);
+    checkLayer(pool, spreadTensor(2, 2, 5, 7, 18), 19);
+    MaxPool overlapping("pool_3_2", 3, 2);
+    checkLayer(overlapping, spreadTensor(1, 2, 6, 8, 20), 21);
+
+    InnerProduct inner("fc", 3, 2 * 3 * 2);
+    inner.initialise(5);
+    checkLayer(inner, randomTensor(3, 2, 3, 2, 22), 23);
+
+    // the loss: gradient by the scores, weighted
+    Tensor scores = randomTensor(3, 2, 1, 1, 24);
+    const std::vector<int> labels = {1, 0, 1};
+    const std::vector<float> weights = {1, 2, 0.5f};
+    Tensor gradient;
+    softmaxCrossEntropy(scores, labels, weights, gradient);
+    for (size_t i = 0; i < scores.size(); ++i) {
+        Tensor g;
+        const float keep = scores.v[i];
+        scores.v[i] = keep + 1e-2f;
+        const double up = softmaxCrossEntropy(scores, labels, weights, g);
+        scores.v[i] = keep - 1e-2f;
+        const double down = softmaxCrossEntropy(scores, labels, weights, g);
+        scores.v[i] = keep;
+        EXPECT_NEAR((up - down) / 2e-2, gradient.v[i], 1e-3) << i;
+    }
+}
+
+TEST(NnTrain, ShapesFollowTheRuntimesRounding) {
+    // convolution drops the last window, pooling keeps a clipped one
+    Conv conv("c", 1, 1, 3, 3, 2);
+    int c, h, w;
+    conv.outputShape(1, 60, 35, c, h, w);
+    EXPECT_EQ(h, 29);
+    EXPECT_EQ(w, 17);
+    EXPECT_EQ(pooledSize(5, 2, 2), 3);
+    EXPECT_EQ(pooledSize(7, 3, 2), 3);
+    EXPECT_EQ(pooledSize(8, 3, 2), 4);
+    // the palm chains end in two scores at 1 x 1
+    Net small = palmChain(kPalm35x33, 33, 35), large = palmChain(kPalm50x60, 60, 50);
+    small.outputShape(c, h, w);
+    EXPECT_EQ(c * h * w, 2);
+    large.outputShape(c, h, w);
+    EXPECT_EQ(c * h * w, 2);
+    EXPECT_THROW(Net(1, 33, 35).add(std::make_unique<Conv>("x", 2, 3, 3, 3)), std::invalid_argument);
+}
+
+TEST(NnTrain, LearnsASeparableProblem) {
+    // class 1: a bright bar in the left half of an 8 x 8 noise patch; class 0: on the right
+    const int count = 400;
+    PatchSet data;
+    data.inputs.resize(count, 1, 8, 8);
+    data.labels.resize(count);
+    std::mt19937 random(5);
+    std::uniform_real_distribution<float> noise(0, 0.4f);
+    for (int i = 0; i < count; ++i) {
+        data.labels[i] = i % 2;
+        float* x = data.inputs.sample(i);
+        for (int k = 0; k < 64; ++k) x[k] = noise(random);
+        const int column = (i % 2 ? 0 : 4) + static_cast<int>(random() % 4);
+        for (int y = 0; y < 8; ++y) x[y * 8 + column] += 0.6f;
+    }
+    Net net(1, 8, 8);
+    net.add(std::make_unique<Conv>("conv1", 4, 1, 3, 3));
+    net.add(std::make_unique<PRelu>("PReLU1", 4));
+    net.add(std::make_unique<MaxPool>("pool1", 2, 2));
+    net.add(std::make_unique<InnerProduct>("final", 2, 4 * 3 * 3));
+    net.initialise(1);
+    const Evaluation before = evaluate(net, data, 0.5f);
+    TrainOptions options;
+    options.epochs = 8;
+    options.rate = 0.05f;
+    options.warmup = 0;
+    std::ostringstream log;
+    train(net, data, options, log);
+    const Evaluation after = evaluate(net, data, 0.5f);
+    EXPECT_GT(after.accuracy(), 0.97) << log.str();
+    EXPECT_LT(after.loss, before.loss * 0.3);
+    EXPECT_EQ(after.positives, count / 2);
+}
+
+TEST(NnTrain, ExportedNetworksGiveTheTrainersScores) {
+    // every recipe's shape: palm chains, and the small ones with pooling on odd sizes,
+    // inner products and a colour input
+    for (const Recipe& recipe : recipes()) {
+        SCOPED_TRACE(recipe.name);
+        Net net = makeNet(recipe);
+        net.initialise(7);
+        // a few steps, so that slopes and biases leave their starting values
+        Tensor batch = randomTensor(4, net.channels(), net.height(), net.width(), 30);
+        for (float& x : batch.v) x = 0.5f + 0.5f * x;
+        const std::vector<int> labels = {1, 0, 1, 0};
+        Tensor gradient;
+        for (int step = 0; step < 3; ++step) {
+            net.zeroGradients();
+            softmaxCrossEntropy(net.forward(batch), labels, std::vector<float>(4, 1.0f), gradient);
+            net.backward(gradient);
+            Sgd{0.05f, 0.9f, 1e-4f}.step(net, 4);
+        }
+        NnDetector exported = exportNetwork(net, recipe.name, recipe.mode);
+        std::stringstream file;
+        LQ::ArchiveO writer(file);
+        writer & exported;
+        NnDetector loaded;
+        LQ::ArchiveI reader(file);
+        reader & loaded;
+        EXPECT_EQ(loaded.getName(), recipe.name);
+        EXPECT_EQ(loaded.getInputColorMode(), recipe.mode);
+        EXPECT_EQ(loaded.getSize(), LQ::BaseSize<int>(recipe.width, recipe.height));
+        const Tensor& scores = net.forward(batch);
+        for (int i = 0; i < batch.n; ++i) {
+            Blob input = toBlob(batch, i);
+            const std::vector<float> theirs = loaded.detect(input);
+            ASSERT_EQ(theirs.size(), 2u);
+            for (int k = 0; k < 2; ++k)
+                EXPECT_NEAR(theirs[k], scores.sample(i)[k], 1e-4f + 1e-4f * std::fabs(scores.sample(i)[k]));
+        }
+        // an image through the runtime's own conversion, colour planes included
+        LQ::Image image(LQ::BaseSize<int>(recipe.width, recipe.height), recipe.mode);
+        std::mt19937 random(9);
+        for (int y = 0; y < image.height(); ++y)
+            for (int x = 0; x < image.width() * image.depth(); ++x) image.row(y)[x] = static_cast<unsigned char>(random());
+        Tensor one(1, net.channels(), net.height(), net.width());
+        for (int k = 0; k < image.depth(); ++k)
+            for (int y = 0; y < image.height(); ++y)
+                for (int x = 0; x < image.width(); ++x)
+                    one.v[(static_cast<size_t>(k) * image.height() + y) * image.width() + x] = image.pixel(x, y)[k] / 256.0f;
+        const std::vector<float> fromImage = loaded.detect(image);
+        const Tensor& mine = net.forward(one);
+        for (int k = 0; k < 2; ++k) EXPECT_NEAR(fromImage[k], mine.v[k], 1e-4f + 1e-4f * std::fabs(mine.v[k]));
+    }
+}
+
+TEST(NnTrain, PatchesAreRepeatableAndLabelled) {
+    DataOptions options;
+    options.positives = 3;
+    options.negatives = 5;
+    options.seed = 4;
+    const Recipe& fist = *findRecipe("fist_verifier_iter_135000");
+    const PatchSet a = makePatches(fist, options);
+    options.threads = 2;
+    const PatchSet b = makePatches(fist, options);
+    EXPECT_EQ(a.inputs.v, b.inputs.v);
+    EXPECT_EQ(a.labels, (std::vector<int>{1, 1, 1, 0, 0, 0, 0, 0}));
+    EXPECT_EQ(a.inputs.c, 1);
+    EXPECT_EQ(a.inputs.h, 32);
+    // the side network's label is whether the hit's side is wrong: about half of them
+    const Recipe& side = *findRecipe("pointer_hand_side__iter_7500");
+    options.threads = 1;
+    const PatchSet s = makePatches(side, options);
+    int wrong = 0;
+    for (int l : s.labels) wrong += l;
+    EXPECT_GT(wrong, 0);
+    EXPECT_LT(wrong, 8);
+    const Recipe& victory = *findRecipe("victory_verifier_face_pos_color_2017_12_14__iter_39000");
+    EXPECT_EQ(makePatches(victory, options).inputs.c, 3);
+    EXPECT_EQ(findRecipe("no such network"), nullptr);
+}
