@@ -2,12 +2,14 @@
 // turn it takes from the host, the minimum widths, and the palm rejector.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include "AdaBoostDetector.h"
 #include "GestureEngines.h"
 #include "GestureRings.h"
 #include "GlyphModels.h"
+#include "LQ_ArchiveI.h"
 #include "LQ_ColorModeData.h"
 #include "LQ_States.h"
 #include "PalmVerifiers.h"
@@ -204,4 +206,35 @@ TEST(MultiEngines, PalmRejector) {
     state->get<LQ::LocationState>().reset();
     rejector.detect(state);
     EXPECT_FALSE(static_cast<const LQ::ObjectLocation&>(state->get<LQ::LocationState>()).isSet());
+}
+
+// Where the palm verifiers come from: with no network file in the directory, the trained
+// tables compiled in, equal to the committed model files; with a file, the file. Each case
+// runs in a child process, since a verifier is made once per process.
+TEST(MultiEngines, CompiledPalmVerifiersUnlessAFileIsThere) {
+    const auto inChild = [](const std::string& directory, const std::string& expectedFrom) {
+        const pid_t child = fork();
+        if (child == 0) {
+            setNetworkDirectory(directory);
+            bool same = true;
+            for (const std::string name : {"palm_verifier__iter_250000", "palm_verifier_iter_140000"}) {
+                NnDetector expected;
+                LQ::ArchiveI::load(expectedFrom + "/" + name + ".nn", expected);
+                const bool first = name == "palm_verifier__iter_250000";
+                NnDetector filled;
+                first ? palm_verifier__iter_250000(filled) : palm_verifier_iter_140000(filled);
+                const SharedPtr<NNDetector> shared = first ? palm_verifier__iter_250000() : palm_verifier_iter_140000();
+                same = same && filled == expected && *shared == expected;
+            }
+            _exit(same ? 0 : 1);
+        }
+        int status = -1;
+        waitpid(child, &status, 0);
+        return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    };
+    const std::string empty = ::testing::TempDir() + "tactus_no_networks_" + std::to_string(getpid());
+    mkdir(empty.c_str(), 0700);
+    EXPECT_EQ(inChild(empty, TACTUS_NETWORK_MODELS), 0);
+    EXPECT_EQ(inChild(modelDirectory(), modelDirectory()), 0);
+    EXPECT_NE(inChild(modelDirectory(), TACTUS_NETWORK_MODELS), 0);
 }

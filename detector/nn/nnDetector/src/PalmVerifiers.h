@@ -1,8 +1,8 @@
 #pragma once
 // The two palm verifiers the rejectors ask for by name, in the two forms of a generated
-// network unit. Until their trained tables are compiled in, each is read once from
-// "<name>.nn" in the network directory; a missing or broken file ends in a failed check,
-// and the next call tries again. Every call of the second form gives an independent
+// network unit. Each is made once: from "<name>.nn" in the network directory when that file
+// is there, else from the trained tables compiled in; a broken file, or neither source,
+// ends in a failed check, and the next call tries again. Every call of the second form gives an independent
 // network that shares the loaded weights.
 
 #include <string>
