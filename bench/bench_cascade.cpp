@@ -2,7 +2,9 @@
 // of the fist ring's shape (window sizes, stage sizes and feature mix) whose random tables
 // are given thresholds that pass about 5 % of windows at the first stage and about 20 % of
 // what reaches each later stage. OpenCV's LBP face cascade on the same frame runs beside it
-// where Debian's opencv-data is installed.
+// where Debian's opencv-data is installed. Then the same scan with the trained rings
+// compiled into the library, over a generated background, with the share of windows that
+// reaches each stage.
 
 #include <benchmark/benchmark.h>
 
@@ -16,6 +18,8 @@
 #include <vector>
 
 #include "AdaBoostDetector.h"
+#include "GestureRings.h"
+#include "HandClip.h"
 #include "LQ_BaseDetector.h"
 #include "LQ_ImageData.h"
 #include "LQ_States.h"
@@ -261,6 +265,102 @@ void BM_TriggerScanToStage(benchmark::State& state) {
     }
 }
 BENCHMARK(BM_TriggerScanToStage)->DenseRange(1, 4)->Unit(benchmark::kMicrosecond);
+
+// The luma of a generated clip's frame with no hand in it: textures, clutter, faces, arms.
+LQ::Image generatedBackground() {
+    handgen::ClipSetup setup;
+    setup.width = kWidth;
+    setup.height = kHeight;
+    setup.frames = 120;
+    setup.seed = 5;
+    const handgen::ClipMaker maker(setup);
+    int frame = 0;
+    while (frame + 1 < maker.frames() && maker.truth(frame).present) ++frame;
+    std::vector<std::uint8_t> rgb;
+    maker.render(frame, rgb);
+    LQ::Image image(LQ::BaseSize<int>(kWidth, kHeight), LQ::COLOR_MODE_MONO);
+    for (int y = 0; y < kHeight; ++y)
+        for (int x = 0; x < kWidth; ++x) {
+            const std::uint8_t* p = &rgb[(static_cast<size_t>(y) * kWidth + x) * 3];
+            image.pixel(x, y)[0] = static_cast<unsigned char>((77 * p[0] + 150 * p[1] + 29 * p[2] + 128) >> 8);
+        }
+    return image;
+}
+
+// A trained ring's cascades for the angles -30 to 30 and both hands, as a trigger asks for
+// them, over the generated background.
+struct TrainedFixture {
+    LQ::Image image = generatedBackground();
+    LQ::SharedPtr<LQ::ImageData> root{new LQ::ImageData()};
+    LQ::SharedPtr<LQ::ImagePyramidData> pyramid;
+    std::vector<CascadedClassifier*> cascades;
+    std::unique_ptr<AdaBoostDetector> detector;
+    std::vector<double> reaching;  // windows that reach each stage, over all layers and cascades
+
+    explicit TrainedFixture(ClassifierRing* ring) {
+        root->set(image);
+        pyramid = LQ::SharedPtr<LQ::ImagePyramidData>(new LQ::ImagePyramidData(root, 1));
+        cascades = ring->getClassifiers(LQ::AngleRange(-30, 30), LQ::Side::BOTH);
+        const LQ::DetectRegion region(LQ::BaseRect<int>(0, 0, kWidth, kHeight), LQ::BaseRange<float>(28, 1000),
+                                      LQ::AngleRange(), LQ::Side::BOTH);
+        detector.reset(new AdaBoostDetector(
+            cascades, pyramid, AdaBoostDetector::StoreTarget::CHILD_STATES, new LQ::DetectRegionSetter(region), 2, 3,
+            0.3f, LQ::SharedPtr<LQ::BaseDetector>(), LQ::SharedPtr<LQ::BaseDetector>(),
+            LQ::SharedPtr<LQ::BaseDetector>(), LQ::RelativeLocation(1, LQ::BasePoint<float>(0, 0), 0, 0, 0), 1000));
+        frame();
+        countReaching();
+    }
+
+    void frame() {
+        root->resetRecursive();
+        root->set(image);
+        root->updateRecursive();
+        LQ::SharedPtr<LQ::StateAggregator> state = LQ::StateAggregator::newDetectorState();
+        detector->detect(state);
+    }
+
+    // every layer the detector scans, each cascade cut after stage s with that stage
+    // letting everything through: the windows that reach stage s + 1
+    void countReaching() {
+        for (const auto& entry : detector->classifierMap()) {
+            const float zoom = entry.first;
+            const LQ::Image& rmct = pyramid->getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get();
+            const LQ::Image& mono = pyramid->getByZoom(LQ::COLOR_MODE_MONO, zoom)->get();
+            const LQ::Image& integral = pyramid->getByZoom(LQ::COLOR_MODE_INTEGRAL, 1.f)->get();
+            for (const CascadedClassifier* whole : entry.second) {
+                const size_t stages = whole->stages().size();
+                if (reaching.size() < stages + 1) reaching.resize(stages + 1);
+                for (size_t s = 0; s <= stages; ++s) {
+                    CascadedClassifier prefix(*whole);
+                    prefix.stages().resize(std::max<size_t>(s, 1));
+                    if (s == 0) prefix.setLastStageThreshold(INT_MIN);
+                    std::vector<AdaObject> reached;
+                    prefix.addMatches(rmct, mono, integral, reached, zoom, 2);
+                    reaching[s] += static_cast<double>(reached.size());
+                }
+            }
+        }
+    }
+};
+
+// The compiled fist ring: what a fist trigger frame's scan costs with trained tables.
+void BM_TrainedFistRingFullFrame(benchmark::State& state) {
+    static TrainedFixture f(ada_Fist_2013_10_02__16_45_30());
+    for (auto _ : state) f.frame();
+    state.counters["windows"] = f.reaching[0];
+    for (size_t s = 1; s < f.reaching.size(); ++s)
+        state.counters["pass" + std::to_string(s)] = f.reaching[s] / f.reaching[s - 1];
+}
+BENCHMARK(BM_TrainedFistRingFullFrame)->Unit(benchmark::kMicrosecond);
+
+void BM_TrainedThumbUpRingFullFrame(benchmark::State& state) {
+    static TrainedFixture f(ada_thumbUp_ada__2017_11_13__20_01_17());
+    for (auto _ : state) f.frame();
+    state.counters["windows"] = f.reaching[0];
+    for (size_t s = 1; s < f.reaching.size(); ++s)
+        state.counters["pass" + std::to_string(s)] = f.reaching[s] / f.reaching[s - 1];
+}
+BENCHMARK(BM_TrainedThumbUpRingFullFrame)->Unit(benchmark::kMicrosecond);
 
 #if defined(TACTUS_WITH_OPENCV_OBJDETECT)
 void BM_OpenCvLbpFaceCascade(benchmark::State& state) {
