@@ -2,8 +2,10 @@
 # Reproduces the README's evaluation of the trained models: draws held-out clips of
 # synthetic hands (seeds and lengths not used in training) and runs tactus_evaluate on
 # them per mode twice, with the trained networks of models/networks and with permissive
-# networks (the glyph stand-ins' .nn files, which pass every patch), so that the table
-# shows what the verifiers remove and what they cost. Rings come compiled in either way.
+# chain networks (the glyph stand-ins' .nn files, which pass every patch), so that the
+# table shows what the verifiers remove and what they cost. Rings and the palm rejector's
+# two verifiers come compiled in either way: the glyph palm verifiers would see a palm
+# everywhere and refuse every victory and pointer.
 # Every clip shows a fist, a thumb up, a victory sign and a pointer in turn.
 #   scripts/evaluate.sh [modes] [seeds]     defaults: fist,thumbUp  101 102
 set -euo pipefail
@@ -17,7 +19,10 @@ mkdir -p "$out/glyph" "$out/permissive"
 tools=build/release/tools
 # only the networks: a glyph .ring file here would win over the compiled ring
 "$tools/make_glyph_models" "$out/glyph" --frames 1 >/dev/null
-cp "$out"/glyph/*.nn "$out/permissive/"
+rm -f "$out"/permissive/*.nn
+for f in "$out"/glyph/*.nn; do
+  [[ "$(basename "$f")" == palm_verifier* ]] || cp "$f" "$out/permissive/"
+done
 for seed in $seeds; do
   clip="$out/held$seed"
   if [[ ! -s "$clip.y4m" || ! -s "$clip.jsonl" ]]; then
