@@ -17,7 +17,11 @@ struct Answers {
     float fist = 1, thumbUp = 1, victory = 1, heart = 1;
     float pointer = 0.5f;  // passes the lax pointer verifier, fails the strict one
     float palm = 1;        // the rejectors' palm verifiers
+    float sideWrong = 1;   // the pointer's hand-side network: 1 turns every hit's side
 };
+// Every verifier passes, no palm is seen and no side is turned: the chains run on their
+// rings alone.
+Answers permissiveAnswers();
 
 // the palm ring fires on glyphs::kFrame, every other ring on glyphs::kF; throws
 // std::runtime_error if a file can't be written

@@ -1,4 +1,4 @@
-// make_glyph_models DIR [--orientation DEGREES] [--back-camera] [--frames N]
+// make_glyph_models DIR [--orientation DEGREES] [--back-camera] [--frames N] [--permissive]
 //
 // Writes the glyph stand-in models into DIR and DIR/sample.y4m, a 1280x720 clip in which
 // the F glyph enters, crosses the frame and leaves, drawn upright for the device's
@@ -68,17 +68,18 @@ void writeY4m(const std::string& path, const std::string& truthPath, int turns, 
 
 int main(int argc, char** argv) {
     if (argc < 2) {
-        std::cerr << "usage: make_glyph_models DIR [--orientation DEGREES] [--back-camera] [--frames N]\n";
+        std::cerr << "usage: make_glyph_models DIR [--orientation DEGREES] [--back-camera] [--frames N] [--permissive]\n";
         return 2;
     }
     const std::string directory = argv[1];
     int orientation = 0, frames = 48;
-    bool front = true;
+    bool front = true, permissive = false;
     for (int i = 2; i < argc; ++i) {
         const std::string arg = argv[i];
         if (arg == "--orientation" && i + 1 < argc) orientation = std::atoi(argv[++i]);
         else if (arg == "--back-camera") front = false;
         else if (arg == "--frames" && i + 1 < argc) frames = std::max(1, std::atoi(argv[++i]));
+        else if (arg == "--permissive") permissive = true;
         else {
             std::cerr << "make_glyph_models: unknown option " << arg << "\n";
             return 2;
@@ -87,7 +88,7 @@ int main(int argc, char** argv) {
     for (size_t i = 1; i <= directory.size(); ++i)
         if (i == directory.size() || directory[i] == '/') mkdir(directory.substr(0, i).c_str(), 0777);
     try {
-        glyphModels::write(directory);
+        glyphModels::write(directory, permissive ? glyphModels::permissiveAnswers() : glyphModels::Answers());
         writeY4m(directory + "/sample.y4m", directory + "/sample.jsonl", turnsOf(orientation, front), frames);
     } catch (const std::exception& error) {
         std::cerr << "make_glyph_models: " << error.what() << "\n";
