@@ -4,7 +4,7 @@
 // what reaches each later stage. OpenCV's LBP face cascade on the same frame runs beside it
 // where Debian's opencv-data is installed. Then the same scan with the trained rings
 // compiled into the library, over a generated background, with the share of windows that
-// reaches each stage.
+// reaches each stage, and one layer's census stages taken in lists or densely by row.
 
 #include <benchmark/benchmark.h>
 
@@ -128,7 +128,7 @@ struct Fixture {
 
     // Thresholds stage by stage from the sums of the windows that reach each stage, on the
     // layer at zoom 1.2 of the scene.
-    void calibrate(CascadedClassifier& cascade) {
+    void calibrate(CascadedClassifier& cascade, double firstPass = 0.05, double laterPass = 0.20) {
         const float zoom = 1.2f;
         const LQ::Image& rmct = pyramid->getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get();
         const LQ::Image& mono = pyramid->getByZoom(LQ::COLOR_MODE_MONO, zoom)->get();
@@ -144,7 +144,7 @@ struct Fixture {
             prefix.addMatches(rmct, mono, integral, reached, zoom, 2);
             std::vector<int> scores;
             for (const AdaObject& o : reached) scores.push_back(o.score);
-            const double pass = s == 0 ? 0.05 : 0.20;
+            const double pass = s == 0 ? firstPass : laterPass;
             std::nth_element(scores.begin(), scores.begin() + static_cast<long>(scores.size() * (1 - pass)), scores.end());
             stages[s].setThreshold(scores.empty() ? 0 : scores[static_cast<size_t>(scores.size() * (1 - pass))]);
         }
@@ -265,6 +265,39 @@ void BM_TriggerScanToStage(benchmark::State& state) {
     }
 }
 BENCHMARK(BM_TriggerScanToStage)->DenseRange(1, 4)->Unit(benchmark::kMicrosecond);
+
+// One layer (zoom 1.2, step 2) scanned by a cascade of two census stages of 7 and 36 tests,
+// the first passing the given percentage of windows and the second 1 % of those, with the
+// second stage in lists (0) or taken densely for each row (1). Where the two ways cross is
+// the share from which the scan takes the dense way.
+void BM_CensusRowStages(benchmark::State& state) {
+    Fixture& f = fixture();
+    const int percent = static_cast<int>(state.range(0));
+    static std::map<int, std::unique_ptr<CascadedClassifier>> cascades;
+    std::unique_ptr<CascadedClassifier>& cascade = cascades[percent];
+    if (!cascade) {
+        std::mt19937 random(23);
+        const Shape shape{{40, 35}, {20, 18}, 0, {7, 36}, {0, 0}, {0, 0}};
+        cascade.reset(new CascadedClassifier(f.build(shape, random)));
+        f.calibrate(*cascade, percent / 100.0, 0.01);
+    }
+    cascade->setDenseRowShare(state.range(1) ? 0.0 : 2.0);
+    const float zoom = 1.2f;
+    const LQ::Image& rmct = f.pyramid->getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get();
+    const LQ::Image& mono = f.pyramid->getByZoom(LQ::COLOR_MODE_MONO, zoom)->get();
+    const LQ::Image& integral = f.pyramid->getByZoom(LQ::COLOR_MODE_INTEGRAL, 1.f)->get();
+    std::vector<AdaObject> objects;
+    for (auto _ : state) {
+        objects.clear();
+        cascade->addMatches(rmct, mono, integral, objects, zoom, 2);
+        benchmark::DoNotOptimize(objects.data());
+    }
+    state.counters["objects"] = static_cast<double>(objects.size());
+}
+BENCHMARK(BM_CensusRowStages)
+    ->ArgsProduct({{2, 5, 10, 15, 20, 30, 50}, {0, 1}})
+    ->ArgNames({"firstPassPercent", "dense"})
+    ->Unit(benchmark::kMicrosecond);
 
 // The luma of a generated clip's frame with no hand in it: textures, clutter, faces, arms.
 LQ::Image generatedBackground() {

@@ -41,6 +41,7 @@ CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& othe
     sharedName_ = other.sharedName_;
     hogComputations_ = 0;
     layerHog_ = nullptr;
+    denseRowShare_ = other.denseRowShare_;
     hogRowLength_ = other.hogRowLength_;
     return *this;
 }
@@ -200,6 +201,9 @@ bool CascadedClassifier::passesFrom(int first, const unsigned char* r, const uns
 }
 
 namespace {
+// row stages taken densely at most
+constexpr int kMaxDenseStages = 16;
+
 bool censusOnly(const StrongClassifier& stage) {
     return stage.haarClassifiers().empty() && stage.hogClassifiers().empty();
 }
@@ -268,20 +272,43 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
         i = integral + pShift[w.y] * integralStride + pShift[w.x];
     };
 
+    // The row stages the dense kernel can take from the first on: those whose sums fit its
+    // 16-bit lanes. It pays where many windows pass the first stage; whether they do is taken
+    // from the row before, rows being alike.
+    CensusStage dense[kMaxDenseStages];
+    int denseCount = 0;
+    if (firstStageFlag_ && testCount <= kMaxVectorCensusTests) {
+        dense[denseCount++] = CensusStage{tests, testCount, firstThreshold_};
+        for (int s = 1; s < rowStages && denseCount < kMaxDenseStages; ++s) {
+            const StrongClassifier& stage = strongClassifiers[s];
+            const int n = static_cast<int>(stage.packedEnd() - stage.packedBegin());
+            if (n > kMaxVectorCensusTests) break;
+            dense[denseCount++] = CensusStage{stage.packedBegin(), n, stage.getThreshold()};
+        }
+    }
+    int reached[kMaxDenseStages] = {};
+    bool denseRow = false;
+
     int listed = 0;
     for (int y = rect.top; y <= rect.bottom; y += step) {
         const unsigned char* rmctRow = rmct.data() + y * rmctStride;
-        int n = count;
-        if (firstStageFlag_) {
+        int n = count, from = startStage_;
+        if (denseRow) {
+            n = censusStagesPass(rmctRow + rect.left, rmctEnd, step, count, dense, denseCount, passed, scores,
+                                 reached);
+            from = denseCount;
+        } else if (firstStageFlag_) {
             n = firstStagePasses(rmctRow + rect.left, rmctEnd, step, count, tests, testCount, firstThreshold_,
                                  passed, scores);
+            reached[0] = n;
         } else {
             for (int k = 0; k < count; ++k) passed[k] = k;
             std::fill(scores, scores + count, 0);
         }
+        denseRow = denseCount > 1 && reached[0] >= denseRowShare_ * count;
         Survivor* row = list + listed;
         for (int c = 0; c < n; ++c) row[c] = Survivor{rect.left + passed[c] * step, y, scores[c]};
-        for (int s = startStage_; s < rowStages && n > 0; ++s) n = keepPassing(strongClassifiers[s], row, n, plain);
+        for (int s = from; s < rowStages && n > 0; ++s) n = keepPassing(strongClassifiers[s], row, n, plain);
         listed += n;
     }
 

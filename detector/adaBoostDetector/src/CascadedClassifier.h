@@ -1,7 +1,8 @@
 #pragma once
 // A series of stages over a window of fixed size, and the integer scan of one pyramid
-// layer. Almost every window ends in the first stage, which the scan evaluates for a row of
-// windows at once; the few that pass go on through the later stages in lists.
+// layer. Most windows end in the first stage, which the scan evaluates for a row of windows
+// at once; those that pass go on through the later stages in lists. Where many pass it, the
+// census stages that follow are evaluated for the row at once too.
 
 #include <istream>
 #include <map>
@@ -33,6 +34,9 @@ struct LayerHog {
 
 class CascadedClassifier : public ClassifierProperties {
 public:
+    // Dense rows cost about the same whatever their share, lists grow with it; they cross
+    // near 30 % (bench_cascade's BM_CensusRowStages).
+    static constexpr double kDenseRowShare = 0.3;
     CascadedClassifier() = default;
     // a copy carries the run-time state, re-pointed at its own stages
     CascadedClassifier(const CascadedClassifier& other) : ClassifierProperties(other) { *this = other; }
@@ -75,6 +79,10 @@ public:
     // with a shared layer HOG the scan reads from it instead of making one per window;
     // null goes back to one per window
     void setLayerHog(LayerHog* layerHog) { layerHog_ = layerHog; }
+    // The share of a row's windows passing the first stage from which the next row takes
+    // its census stages at once rather than in lists. Results don't depend on it; tests and
+    // benchmarks set 0 or above 1 to force one way.
+    void setDenseRowShare(double share) { denseRowShare_ = share; }
     const std::vector<StrongClassifier>& stages() const { return strongClassifiers; }
     std::vector<StrongClassifier>& stages() { return strongClassifiers; }
     const LQ::BaseRect<int>& getHogRoi() const { return hogRoi_; }
@@ -114,6 +122,7 @@ private:
     const char* sharedName_ = "";
     long long hogComputations_ = 0;
     LayerHog* layerHog_ = nullptr;
+    double denseRowShare_ = kDenseRowShare;
     // row length the HOG offsets are made for at present
     int hogRowLength_ = 0;
     // a window still in the race, at its position in the layer, and its last stage sum

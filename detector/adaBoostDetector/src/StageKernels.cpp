@@ -3,210 +3,343 @@
 #include <algorithm>
 #include <climits>
 
-int firstStagePassesScalar(const unsigned char* row, const unsigned char* end, int step, int count,
-                           const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
+namespace {
+// as censusStagesPassScalar, with the counts added to reached
+int stagesScalar(const unsigned char* row, int step, int count, const CensusStage* stages, int stageCount,
+                 int* passed, int* sums, int* reached) {
     int found = 0;
     for (int k = 0; k < count; ++k) {
         const unsigned char* window = row + static_cast<ptrdiff_t>(k) * step;
-        int sum = 0;
-        for (int t = 0; t < testCount; ++t) sum += tests[t].table[window[tests[t].offset]];
-        if (sum >= threshold) {
-            passed[found] = k;
-            sums[found] = sum;
-            ++found;
+        int sum = 0, s = 0;
+        for (; s < stageCount; ++s) {
+            const CensusTest* tests = stages[s].tests;
+            sum = 0;
+            for (int t = 0; t < stages[s].testCount; ++t) sum += tests[t].table[window[tests[t].offset]];
+            if (sum < stages[s].threshold) break;
+            if (reached) ++reached[s];
         }
+        if (s < stageCount) continue;
+        passed[found] = k;
+        sums[found] = sum;
+        ++found;
     }
     return found;
 }
 
-namespace {
-// The vector sums are 16-bit: 255 scores of -128 .. 127 stay inside.
-constexpr int kMaxVectorTests = 255;
-
-bool vectorSums(const CensusTest* tests, int testCount) {
-    return testCount > 0 && testCount <= kMaxVectorTests;
+[[maybe_unused]] bool vectorSums(const CensusStage* stages, int stageCount) {
+    for (int s = 0; s < stageCount; ++s)
+        if (stages[s].testCount > kMaxVectorCensusTests) return false;
+    return true;
 }
 
-int largestOffset(const CensusTest* tests, int testCount) {
+[[maybe_unused]] int largestOffset(const CensusStage* stages, int stageCount) {
     int largest = 0;
-    for (int t = 0; t < testCount; ++t) largest = std::max(largest, tests[t].offset);
+    for (int s = 0; s < stageCount; ++s)
+        for (int t = 0; t < stages[s].testCount; ++t) largest = std::max(largest, stages[s].tests[t].offset);
     return largest;
 }
 
+// Windows left in a block from which the later stages go window by window: a quarter of
+// it (bench_cascade's BM_CensusRowStages: a block's 36-test stage costs about as much as
+// eight to twelve windows taken one by one).
+[[maybe_unused]] constexpr int kFewLanes32 = 8;
+[[maybe_unused]] constexpr int kFewLanes16 = 4;
+
 // a threshold outside the 16-bit range passes all or nothing, as its clamped value does
-short clampedThreshold(int threshold) {
+[[maybe_unused]] short clampedThreshold(int threshold) {
     return static_cast<short>(
         std::min(std::max(threshold, static_cast<int>(SHRT_MIN)), static_cast<int>(SHRT_MAX)));
 }
 
 // the census bytes of windows 0, step, 2 step, ... copied side by side
-void gatherCodes(const unsigned char* p, int step, int n, unsigned char* codes) {
+[[maybe_unused]] void gatherCodes(const unsigned char* p, int step, int n, unsigned char* codes) {
     for (int j = 0; j < n; ++j) codes[j] = p[j * step];
+}
+
+// The windows k + lanes[0 .. n) of a block whose first census byte is p, through the stages
+// window by window, four at a time: cheaper than whole blocks once few windows are left.
+// Appends the passes to passed and sums from found and returns the new count.
+[[maybe_unused]] int fewWindows(const unsigned char* p, int step, int k, int* lanes, int n, const CensusStage* stages,
+                                int stageCount, int* passed, int* sums, int found, int* reached) {
+    int last[32];
+    for (int s = 0; s < stageCount && n > 0; ++s) {
+        const CensusTest* tests = stages[s].tests;
+        const int threshold = stages[s].threshold;
+        int kept = 0;
+        int c = 0;
+        for (; c + 4 <= n; c += 4) {
+            int group[4];
+            const unsigned char* w[4];
+            for (int j = 0; j < 4; ++j) {
+                group[j] = lanes[c + j];
+                w[j] = p + static_cast<ptrdiff_t>(group[j]) * step;
+            }
+            int sum[4] = {0, 0, 0, 0};
+            for (int t = 0; t < stages[s].testCount; ++t) {
+                const LQ::schar* table = tests[t].table;
+                const int offset = tests[t].offset;
+                for (int j = 0; j < 4; ++j) sum[j] += table[w[j][offset]];
+            }
+            // written behind the reading position: kept never passes c
+            for (int j = 0; j < 4; ++j) {
+                lanes[kept] = group[j];
+                last[kept] = sum[j];
+                kept += sum[j] >= threshold;
+            }
+        }
+        // the rest one by one, in two running sums
+        for (; c < n; ++c) {
+            const int lane = lanes[c];
+            const unsigned char* w = p + static_cast<ptrdiff_t>(lane) * step;
+            int even = 0, odd = 0, t = 0;
+            for (; t + 1 < stages[s].testCount; t += 2) {
+                even += tests[t].table[w[tests[t].offset]];
+                odd += tests[t + 1].table[w[tests[t + 1].offset]];
+            }
+            if (t < stages[s].testCount) even += tests[t].table[w[tests[t].offset]];
+            lanes[kept] = lane;
+            last[kept] = even + odd;
+            kept += even + odd >= threshold;
+        }
+        n = kept;
+        if (reached) reached[s] += n;
+    }
+    for (int i = 0; i < n; ++i) {
+        passed[found] = k + lanes[i];
+        sums[found] = last[i];
+        ++found;
+    }
+    return found;
+}
+
+// Blocks of width windows from the first, then the last windows in a block that overlaps
+// the one before, or the scalar loop where a block would read past end.
+// block(k, first, found) takes windows k .. k + width - 1, of which those before k + first
+// were done already, and returns found with its passes appended.
+template <int width, class Block>
+int overBlocks(const unsigned char* row, const unsigned char* end, int step, int count, const CensusStage* stages,
+               int stageCount, int* passed, int* sums, int* reached, const Block& block) {
+    if (reached) std::fill(reached, reached + stageCount, 0);
+    if (!vectorSums(stages, stageCount))
+        return stagesScalar(row, step, count, stages, stageCount, passed, sums, reached);
+    const ptrdiff_t reach = largestOffset(stages, stageCount);
+    const auto fits = [&](int k) { return row + static_cast<ptrdiff_t>(k + width) * step + reach <= end; };
+    int found = 0, k = 0;
+    for (; k + width <= count && fits(k); k += width) found = block(k, 0, found);
+    if (k < count && count >= width && fits(count - width)) return block(count - width, k - (count - width), found);
+    const int rest = stagesScalar(row + static_cast<ptrdiff_t>(k) * step, step, count - k, stages, stageCount,
+                                  passed + found, sums + found, reached);
+    for (int j = found; j < found + rest; ++j) passed[j] += k;
+    return found + rest;
 }
 }  // namespace
 
+int censusStagesPassScalar(const unsigned char* row, const unsigned char*, int step, int count,
+                           const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached) {
+    if (reached) std::fill(reached, reached + stageCount, 0);
+    return stagesScalar(row, step, count, stages, stageCount, passed, sums, reached);
+}
+
+int firstStagePassesScalar(const unsigned char* row, const unsigned char* end, int step, int count,
+                           const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
+    const CensusStage stage{tests, testCount, threshold};
+    return censusStagesPassScalar(row, end, step, count, &stage, 1, passed, sums, nullptr);
+}
+
 #if defined(LQ_HAVE_NEON)
-int firstStagePassesNeon(const unsigned char* row, const unsigned char* end, int step, int count,
-                         const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
-    if (!vectorSums(tests, testCount))
-        return firstStagePassesScalar(row, end, step, count, tests, testCount, threshold, passed, sums);
-    const ptrdiff_t reach = largestOffset(tests, testCount);
-    const int16x8_t limit = vdupq_n_s16(clampedThreshold(threshold));
-    int found = 0;
-    // windows k .. k + 15, of which those before first were done already
-    const auto block = [&](int k, int first) {
-        int16x8_t low = vdupq_n_s16(0), high = vdupq_n_s16(0);
-        for (int t = 0; t < testCount; ++t) {
-            const unsigned char* p = row + static_cast<ptrdiff_t>(k) * step + tests[t].offset;
-            uint8x16_t codes;
-            if (step == 1) {
-                codes = vld1q_u8(p);
-            } else if (step == 2) {
-                codes = vld2q_u8(p).val[0];
-            } else {
-                unsigned char gathered[16];
-                gatherCodes(p, step, 16, gathered);
-                codes = vld1q_u8(gathered);
-            }
-            // four look-ups of 64 entries: each keeps the lanes whose code lies outside its quarter
-            const unsigned char* table = reinterpret_cast<const unsigned char*>(tests[t].table);
-            uint8x16_t scores = vdupq_n_u8(0);
-            for (int q = 0; q < 4; ++q) {
-                uint8x16x4_t quarter;
-                for (int v = 0; v < 4; ++v) quarter.val[v] = vld1q_u8(table + 64 * q + 16 * v);
-                const uint8x16_t index = vsubq_u8(codes, vdupq_n_u8(static_cast<uint8_t>(64 * q)));
-                scores = q ? vqtbx4q_u8(scores, quarter, index) : vqtbl4q_u8(quarter, index);
-            }
-            const int8x16_t s = vreinterpretq_s8_u8(scores);
-            low = vaddw_s8(low, vget_low_s8(s));
-            high = vaddw_s8(high, vget_high_s8(s));
+namespace {
+// the 16-bit sums of one stage for the 16 windows whose first census bytes are p, p + step, ...
+inline void sums16(const unsigned char* p, int step, const CensusStage& stage, int16x8_t& low, int16x8_t& high) {
+    low = high = vdupq_n_s16(0);
+    for (int t = 0; t < stage.testCount; ++t) {
+        const unsigned char* codeAt = p + stage.tests[t].offset;
+        uint8x16_t codes;
+        if (step == 1) {
+            codes = vld1q_u8(codeAt);
+        } else if (step == 2) {
+            codes = vld2q_u8(codeAt).val[0];
+        } else {
+            unsigned char gathered[16];
+            gatherCodes(codeAt, step, 16, gathered);
+            codes = vld1q_u8(gathered);
         }
-        const uint8x16_t pass =
-            vcombine_u8(vmovn_u16(vcgeq_s16(low, limit)), vmovn_u16(vcgeq_s16(high, limit)));
-        // one bit per window, at four times its index
-        uint64_t bits = vget_lane_u64(vreinterpret_u64_u8(vshrn_n_u16(vreinterpretq_u16_u8(pass), 4)), 0) &
-                        0x1111111111111111ull & (~0ull << (4 * first));
-        if (!bits) return;
+        // four look-ups of 64 entries: each keeps the lanes whose code lies outside its quarter
+        const unsigned char* table = reinterpret_cast<const unsigned char*>(stage.tests[t].table);
+        uint8x16_t scores = vdupq_n_u8(0);
+        for (int q = 0; q < 4; ++q) {
+            uint8x16x4_t quarter;
+            for (int v = 0; v < 4; ++v) quarter.val[v] = vld1q_u8(table + 64 * q + 16 * v);
+            const uint8x16_t index = vsubq_u8(codes, vdupq_n_u8(static_cast<uint8_t>(64 * q)));
+            scores = q ? vqtbx4q_u8(scores, quarter, index) : vqtbl4q_u8(quarter, index);
+        }
+        const int8x16_t s = vreinterpretq_s8_u8(scores);
+        low = vaddw_s8(low, vget_low_s8(s));
+        high = vaddw_s8(high, vget_high_s8(s));
+    }
+}
+}  // namespace
+
+int censusStagesPassNeon(const unsigned char* row, const unsigned char* end, int step, int count,
+                         const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached) {
+    const auto block = [&](int k, int first, int found) {
+        const unsigned char* p = row + static_cast<ptrdiff_t>(k) * step;
+        // one bit per window still in, at four times its index
+        uint64_t alive = 0x1111111111111111ull & (~0ull << (4 * first));
+        int16x8_t low = vdupq_n_s16(0), high = low;
+        for (int s = 0; s < stageCount; ++s) {
+            sums16(p, step, stages[s], low, high);
+            const int16x8_t limit = vdupq_n_s16(clampedThreshold(stages[s].threshold));
+            const uint8x16_t pass =
+                vcombine_u8(vmovn_u16(vcgeq_s16(low, limit)), vmovn_u16(vcgeq_s16(high, limit)));
+            alive &= vget_lane_u64(vreinterpret_u64_u8(vshrn_n_u16(vreinterpretq_u16_u8(pass), 4)), 0);
+            if (reached) reached[s] += __builtin_popcountll(alive);
+            if (!alive) return found;
+            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes16) {
+                int lanes[16], n = 0;
+                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctzll(alive) >> 2;
+                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                  reached ? reached + s + 1 : nullptr);
+            }
+        }
         short sum[16];
         vst1q_s16(sum, low);
         vst1q_s16(sum + 8, high);
-        for (; bits; bits &= bits - 1) {
-            const int j = __builtin_ctzll(bits) >> 2;
+        for (; alive; alive &= alive - 1) {
+            const int j = __builtin_ctzll(alive) >> 2;
             passed[found] = k + j;
             sums[found] = sum[j];
             ++found;
         }
-    };
-    const auto fits = [&](int k) { return row + static_cast<ptrdiff_t>(k + 16) * step + reach <= end; };
-    int k = 0;
-    for (; k + 16 <= count && fits(k); k += 16) block(k, 0);
-    // the last windows of a row in a block that overlaps the one before
-    if (k < count && count >= 16 && fits(count - 16)) {
-        block(count - 16, k - (count - 16));
         return found;
-    }
-    const int rest = firstStagePassesScalar(row + static_cast<ptrdiff_t>(k) * step, end, step, count - k,
-                                            tests, testCount, threshold, passed + found, sums + found);
-    for (int j = found; j < found + rest; ++j) passed[j] += k;
-    return found + rest;
+    };
+    return overBlocks<16>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
+}
+
+int firstStagePassesNeon(const unsigned char* row, const unsigned char* end, int step, int count,
+                         const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
+    const CensusStage stage{tests, testCount, threshold};
+    return censusStagesPassNeon(row, end, step, count, &stage, 1, passed, sums, nullptr);
 }
 #endif
 
 #if defined(LQ_HAVE_SSSE3)
 namespace {
-// 32 scores of one table: sixteen shuffles of its sixteen rows by the low half of each code,
-// then the high half's bits, moved in turn to the top of each byte, choose among them.
-__attribute__((target("avx2"))) inline __m256i tableRow(const LQ::schar* table, int h, __m256i low) {
+// 32 scores of one table. A shuffle reads 16 entries by the low half of each code and gives
+// 0 where the code's top bit is set: rows h and h + 8, read by the code and by the code with
+// its top bit flipped, combine by an or. Bits 4, 5 and 6, moved in turn to the top of each
+// byte, then choose among the eight pairs.
+__attribute__((target("avx2"))) inline __m256i tableRow(const LQ::schar* table, int h, __m256i codes) {
     const __m128i entries = _mm_loadu_si128(reinterpret_cast<const __m128i*>(table + 16 * h));
-    return _mm256_shuffle_epi8(_mm256_broadcastsi128_si256(entries), low);
+    return _mm256_shuffle_epi8(_mm256_broadcastsi128_si256(entries), codes);
 }
 
 __attribute__((target("avx2"))) inline __m256i lookup256(const LQ::schar* table, __m256i codes) {
-    const __m256i low = _mm256_and_si256(codes, _mm256_set1_epi8(0x0F));
+    const __m256i flipped = _mm256_xor_si256(codes, _mm256_set1_epi8(static_cast<char>(0x80)));
     __m256i pair[8];
+    for (int h = 0; h < 8; ++h)
+        pair[h] = _mm256_or_si256(tableRow(table, h, codes), tableRow(table, h + 8, flipped));
     const __m256i bit4 = _mm256_slli_epi16(codes, 3);
-    for (int j = 0; j < 8; ++j)
-        pair[j] = _mm256_blendv_epi8(tableRow(table, 2 * j, low), tableRow(table, 2 * j + 1, low), bit4);
+    for (int j = 0; j < 4; ++j) pair[j] = _mm256_blendv_epi8(pair[2 * j], pair[2 * j + 1], bit4);
     const __m256i bit5 = _mm256_slli_epi16(codes, 2);
-    for (int j = 0; j < 4; ++j) pair[j] = _mm256_blendv_epi8(pair[2 * j], pair[2 * j + 1], bit5);
+    for (int j = 0; j < 2; ++j) pair[j] = _mm256_blendv_epi8(pair[2 * j], pair[2 * j + 1], bit5);
     const __m256i bit6 = _mm256_slli_epi16(codes, 1);
-    for (int j = 0; j < 2; ++j) pair[j] = _mm256_blendv_epi8(pair[2 * j], pair[2 * j + 1], bit6);
-    return _mm256_blendv_epi8(pair[0], pair[1], codes);
+    return _mm256_blendv_epi8(pair[0], pair[1], bit6);
 }
 
+// The census bytes of 32 windows in the order 0-7, 16-23, 8-15, 24-31 by 8-byte quarters:
+// the order of a 16-bit pack, which the byte unpacks in sums32 undo.
 __attribute__((target("avx2"))) inline __m256i loadCodes(const unsigned char* p, int step) {
-    if (step == 1) return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p));
+    if (step == 1) return _mm256_permute4x64_epi64(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)), 0xD8);
     if (step == 2) {
-        // the even bytes of 64; the pack works per 128-bit half, the permute restores the order
         const __m256i even = _mm256_set1_epi16(0x00FF);
         const __m256i a = _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)), even);
         const __m256i b =
             _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p + 32)), even);
-        return _mm256_permute4x64_epi64(_mm256_packus_epi16(a, b), 0xD8);
+        return _mm256_packus_epi16(a, b);
     }
     alignas(32) unsigned char gathered[32];
-    gatherCodes(p, step, 32, gathered);
+    for (int q = 0; q < 4; ++q)
+        gatherCodes(p + static_cast<ptrdiff_t>((q & 1) * 16 + (q >> 1) * 8) * step, step, 8, gathered + 8 * q);
     return _mm256_load_si256(reinterpret_cast<const __m256i*>(gathered));
+}
+
+// The 16-bit sums of one stage for the 32 windows whose first census bytes are p, p + step,
+// ...: windows 0-15 in low, 16-31 in high. Two tests at a time: their scores interleaved by
+// the unpacks, then added in pairs by a multiply-add with ones.
+__attribute__((target("avx2"))) inline void sums32(const unsigned char* p, int step, const CensusStage& stage,
+                                                   __m256i& low, __m256i& high) {
+    const __m256i ones = _mm256_set1_epi8(1);
+    const CensusTest* tests = stage.tests;
+    low = high = _mm256_setzero_si256();
+    int t = 0;
+    for (; t < stage.testCount; t += 2) {
+        const __m256i a = lookup256(tests[t].table, loadCodes(p + tests[t].offset, step));
+        const __m256i b = t + 1 < stage.testCount
+                              ? lookup256(tests[t + 1].table, loadCodes(p + tests[t + 1].offset, step))
+                              : _mm256_setzero_si256();
+        low = _mm256_add_epi16(low, _mm256_maddubs_epi16(ones, _mm256_unpacklo_epi8(a, b)));
+        high = _mm256_add_epi16(high, _mm256_maddubs_epi16(ones, _mm256_unpackhi_epi8(a, b)));
+    }
 }
 }  // namespace
 
-__attribute__((target("avx2"))) int firstStagePassesAvx2(const unsigned char* row, const unsigned char* end,
-                                                         int step, int count, const CensusTest* tests,
-                                                         int testCount, int threshold, int* passed,
-                                                         int* sums) {
-    if (!vectorSums(tests, testCount))
-        return firstStagePassesScalar(row, end, step, count, tests, testCount, threshold, passed, sums);
-    const ptrdiff_t reach = largestOffset(tests, testCount);
-    const __m256i limit = _mm256_set1_epi16(clampedThreshold(threshold));
-    int found = 0;
-    // windows k .. k + 31, of which those before first were done already
-    const auto block = [&](int k, int first) __attribute__((target("avx2"))) {
-        __m256i low = _mm256_setzero_si256(), high = _mm256_setzero_si256();
-        for (int t = 0; t < testCount; ++t) {
-            const __m256i scores = lookup256(
-                tests[t].table, loadCodes(row + static_cast<ptrdiff_t>(k) * step + tests[t].offset, step));
-            low = _mm256_add_epi16(low, _mm256_cvtepi8_epi16(_mm256_castsi256_si128(scores)));
-            high = _mm256_add_epi16(high, _mm256_cvtepi8_epi16(_mm256_extracti128_si256(scores, 1)));
+__attribute__((target("avx2"))) int censusStagesPassAvx2(const unsigned char* row, const unsigned char* end,
+                                                         int step, int count, const CensusStage* stages,
+                                                         int stageCount, int* passed, int* sums, int* reached) {
+    const auto block = [&](int k, int first, int found) __attribute__((target("avx2"))) {
+        const unsigned char* p = row + static_cast<ptrdiff_t>(k) * step;
+        unsigned int alive = ~0u << first;
+        __m256i low = _mm256_setzero_si256(), high = low;
+        for (int s = 0; s < stageCount; ++s) {
+            sums32(p, step, stages[s], low, high);
+            const __m256i limit = _mm256_set1_epi16(clampedThreshold(stages[s].threshold));
+            const __m256i fail =
+                _mm256_packs_epi16(_mm256_cmpgt_epi16(limit, low), _mm256_cmpgt_epi16(limit, high));
+            alive &= ~static_cast<unsigned int>(_mm256_movemask_epi8(_mm256_permute4x64_epi64(fail, 0xD8)));
+            if (reached) reached[s] += __builtin_popcount(alive);
+            if (!alive) return found;
+            if (s + 1 < stageCount && __builtin_popcount(alive) <= kFewLanes32) {
+                int lanes[32], n = 0;
+                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctz(alive);
+                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                  reached ? reached + s + 1 : nullptr);
+            }
         }
-        const __m256i fail =
-            _mm256_packs_epi16(_mm256_cmpgt_epi16(limit, low), _mm256_cmpgt_epi16(limit, high));
-        unsigned int bits =
-            ~static_cast<unsigned int>(_mm256_movemask_epi8(_mm256_permute4x64_epi64(fail, 0xD8)));
-        bits &= ~0u << first;
-        if (!bits) return;
         alignas(32) short sum[32];
         _mm256_store_si256(reinterpret_cast<__m256i*>(sum), low);
         _mm256_store_si256(reinterpret_cast<__m256i*>(sum + 16), high);
-        for (; bits; bits &= bits - 1) {
-            const int j = __builtin_ctz(bits);
+        for (; alive; alive &= alive - 1) {
+            const int j = __builtin_ctz(alive);
             passed[found] = k + j;
             sums[found] = sum[j];
             ++found;
         }
-    };
-    const auto fits = [&](int k) { return row + static_cast<ptrdiff_t>(k + 32) * step + reach <= end; };
-    int k = 0;
-    for (; k + 32 <= count && fits(k); k += 32) block(k, 0);
-    // the last windows of a row in a block that overlaps the one before
-    if (k < count && count >= 32 && fits(count - 32)) {
-        block(count - 32, k - (count - 32));
         return found;
-    }
-    const int rest = firstStagePassesScalar(row + static_cast<ptrdiff_t>(k) * step, end, step, count - k,
-                                            tests, testCount, threshold, passed + found, sums + found);
-    for (int j = found; j < found + rest; ++j) passed[j] += k;
-    return found + rest;
+    };
+    return overBlocks<32>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
+}
+
+int firstStagePassesAvx2(const unsigned char* row, const unsigned char* end, int step, int count,
+                         const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
+    const CensusStage stage{tests, testCount, threshold};
+    return censusStagesPassAvx2(row, end, step, count, &stage, 1, passed, sums, nullptr);
 }
 #endif
 
+int censusStagesPass(const unsigned char* row, const unsigned char* end, int step, int count,
+                     const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached) {
+#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
+    return censusStagesPassNeon(row, end, step, count, stages, stageCount, passed, sums, reached);
+#elif defined(LQ_HAVE_SSSE3)
+    static const auto kernel = __builtin_cpu_supports("avx2") ? censusStagesPassAvx2 : censusStagesPassScalar;
+    return kernel(row, end, step, count, stages, stageCount, passed, sums, reached);
+#else
+    return censusStagesPassScalar(row, end, step, count, stages, stageCount, passed, sums, reached);
+#endif
+}
+
 int firstStagePasses(const unsigned char* row, const unsigned char* end, int step, int count,
                      const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
-#if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
-    return firstStagePassesNeon(row, end, step, count, tests, testCount, threshold, passed, sums);
-#elif defined(LQ_HAVE_SSSE3)
-    static const auto kernel = __builtin_cpu_supports("avx2") ? firstStagePassesAvx2 : firstStagePassesScalar;
-    return kernel(row, end, step, count, tests, testCount, threshold, passed, sums);
-#else
-    return firstStagePassesScalar(row, end, step, count, tests, testCount, threshold, passed, sums);
-#endif
+    const CensusStage stage{tests, testCount, threshold};
+    return censusStagesPass(row, end, step, count, &stage, 1, passed, sums, nullptr);
 }

@@ -1,7 +1,8 @@
 #pragma once
-// The first stage of a census-only cascade over one row of windows. Nineteen windows in
-// twenty end there, so it is evaluated for many windows at once: the census bytes of
-// neighbouring windows lie side by side, and a 256-entry table is read by byte shuffles.
+// The census-only stages of a cascade over one row of windows. Most windows end in the
+// first, so it is evaluated for many windows at once: the census bytes of neighbouring
+// windows lie side by side, and a 256-entry table is read by byte shuffles. Where many pass
+// the first stage, the census stages after it are cheaper the same way than window by window.
 
 #include "LQ_Neon.h"
 #include "LQ_Utils.h"
@@ -31,3 +32,34 @@ int firstStagePassesAvx2(const unsigned char* row, const unsigned char* end, int
 // the fastest of them on this processor
 int firstStagePasses(const unsigned char* row, const unsigned char* end, int step, int count,
                      const CensusTest* tests, int testCount, int threshold, int* passed, int* sums);
+
+// The vector sums are 16-bit: a stage of up to this many scores of -128 .. 127 stays inside;
+// the vector forms take larger ones by the scalar loop.
+constexpr int kMaxVectorCensusTests = 255;
+
+// One census-only stage: its tests and the sum they must reach.
+struct CensusStage {
+    const CensusTest* tests;
+    int testCount;
+    int threshold;
+};
+
+// The windows as above that pass stages[0], ..., stages[stageCount - 1] in turn (stageCount
+// at least 1): their indices go to passed and the sums of the last stage to sums, in order;
+// returns how many. reached, where given, gets per stage how many windows pass it and every
+// stage before. Windows go through the stages in blocks that stop once none of them is left
+// and go on window by window once few are.
+int censusStagesPassScalar(const unsigned char* row, const unsigned char* end, int step, int count,
+                           const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
+#if defined(LQ_HAVE_NEON)
+int censusStagesPassNeon(const unsigned char* row, const unsigned char* end, int step, int count,
+                         const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
+#endif
+#if defined(LQ_HAVE_SSSE3)
+// only where the processor has AVX2
+int censusStagesPassAvx2(const unsigned char* row, const unsigned char* end, int step, int count,
+                         const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
+#endif
+// the fastest of them on this processor
+int censusStagesPass(const unsigned char* row, const unsigned char* end, int step, int count,
+                     const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);

@@ -503,7 +503,9 @@ CascadedClassifier randomCascade(std::mt19937& random, const std::vector<std::ar
 // window-by-window evaluation from the classifiers' definitions finds: census-only first
 // stages (the vector kernel) and mixed ones, census, Haar and HOG stages after them, one and
 // two HOG stages, steps 1 to 3, zooms 1 and 1.2, odd layer sizes with a wider stride, and the
-// HOG from the layer's shared image or made per window. Thresholds are set from the reference
+// HOG from the layer's shared image or made per window. The census stages after the first go
+// in lists, densely for the row, or each way by the rows' shares; a stage of 300 tests is
+// beyond the dense kernel and ends its run of stages. Thresholds are set from the reference
 // sums so that some windows end at every stage and some pass them all.
 TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
     const std::vector<std::vector<std::array<int, 3>>> shapes = {
@@ -512,6 +514,8 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
         {{4, 3, 0}, {6, 0, 0}, {0, 0, 5}},
         {{2, 0, 3}, {5, 2, 2}},
         {{7, 0, 0}},
+        {{6, 0, 0}, {10, 0, 0}, {8, 0, 0}, {3, 2, 0}},
+        {{4, 0, 0}, {9, 0, 0}, {300, 0, 0}, {7, 0, 0}, {0, 0, 3}},
     };
     std::mt19937 random(29);
     int hits = 0, hogScans = 0;
@@ -520,7 +524,7 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
             for (float zoom : {1.0f, 1.2f}) {
                 std::vector<std::vector<LQ::schar>> tables;
                 CascadedClassifier cascade = randomCascade(random, shapes[shape], tables);
-                const int layerW = 45 + random() % 30, layerH = 38 + random() % 20;
+                const int layerW = 70 + random() % 60, layerH = 38 + random() % 20;
                 Image parent;
                 const Image mono = randomView(layerW, layerH, LQ::COLOR_MODE_MONO, random(), parent);
                 Image rmct, integral;
@@ -557,8 +561,10 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                 ASSERT_FALSE(expected.empty());
                 hits += static_cast<int>(expected.size());
 
-                for (bool shared : {false, true}) {
+                for (bool shared : {false, true})
+                for (double denseShare : {2.0, 0.0, CascadedClassifier::kDenseRowShare}) {
                     CascadedClassifier scanned = cascade;
+                    scanned.setDenseRowShare(denseShare);
                     LayerHog layerHog;
                     if (shared) {
                         layerHog.bind(mono, mono.rect());
@@ -567,13 +573,17 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                     std::vector<AdaObject> objects;
                     scanned.addMatches(rmct, mono, integral, objects, zoom, step);
                     hogScans += shared && layerHog.computed;
-                    ASSERT_EQ(objects.size(), expected.size()) << shape << " " << step << " " << zoom;
+                    ASSERT_EQ(objects.size(), expected.size())
+                        << shape << " " << step << " " << zoom << " " << denseShare;
                     for (size_t k = 0; k < objects.size(); ++k) {
-                        ASSERT_EQ(objects[k].center, expected[k].center) << shape << " " << step << " " << k;
-                        ASSERT_EQ(objects[k].score, expected[k].score) << shape << " " << step << " " << k;
+                        ASSERT_EQ(objects[k].center, expected[k].center)
+                            << shape << " " << step << " " << k << " " << denseShare;
+                        ASSERT_EQ(objects[k].score, expected[k].score)
+                            << shape << " " << step << " " << k << " " << denseShare;
                     }
                 }
             }
     EXPECT_GT(hits, 200);
-    EXPECT_EQ(hogScans, 4 * 3 * 2);
+    // five shapes with HOG, three steps, two zooms, three ways
+    EXPECT_EQ(hogScans, 5 * 3 * 2 * 3);
 }
