@@ -5,7 +5,13 @@
 //            [--heldout-seed S] [--heldout-positives N] [--heldout-negatives N]
 //            [--epochs E] [--batch B] [--rate R] [--threads T] [--set name=low,high]...
 //            [--heldout-set name=low,high]... [--oversample F] [--dump DIR] [--list]
+//            [--mine-clips N] [--mine-seed S] [--mine-frames F] [--mine-step K] [--mine-jitter J]
+//            [--heldout-mine-clips N] [--heldout-mine-seed S] [--ring-dir DIR] [--mined-cache DIR]
+//            [--mined-repeat R]
 //   nn_train --network NAME --out DIR --evaluate [held-out options]   scores DIR/NAME.nn
+//
+// With --mine-clips, patches are also cut from the chain's trigger hits on generated clips
+// (MinedPatches.h) and the held-out figures come from hits mined with another seed.
 #include <chrono>
 #include <cmath>
 #include <cstdio>
@@ -16,7 +22,9 @@
 
 #include "HandSamples.h"
 #include "LQ_ArchiveI.h"
+#include "GestureRings.h"
 #include "LQ_ArchiveO.h"
+#include "MinedPatches.h"
 #include "Trainer.h"
 
 namespace {
@@ -100,13 +108,17 @@ void report(const nntrain::Recipe& recipe, const nntrain::PatchSet& heldOutSet, 
 }  // namespace
 
 int main(int argc, char** argv) {
-    std::string network, out, dump;
+    std::string network, out, dump, minedCache;
+    int minedRepeat = 1;
     bool evaluateOnly = false;
     nntrain::DataOptions data, heldOut;
     heldOut.seed = 1001;
     heldOut.positives = 1000;
     heldOut.negatives = 2000;
     nntrain::TrainOptions train;
+    nntrain::MiningOptions mine, heldOutMine;
+    mine.clips = heldOutMine.clips = 0;
+    heldOutMine.seed = 9101;
     bool positivesGiven = false, negativesGiven = false;
     std::ostringstream command;
     for (int i = 0; i < argc; ++i) command << (i ? " " : "") << argv[i];
@@ -134,6 +146,16 @@ int main(int argc, char** argv) {
         else if (arg == "--threads") data.threads = heldOut.threads = std::stoi(value());
         else if (arg == "--oversample") data.oversample = heldOut.oversample = std::stof(value());
         else if (arg == "--dump") dump = value();
+        else if (arg == "--mine-clips") mine.clips = std::stoi(value());
+        else if (arg == "--mine-seed") mine.seed = std::stoull(value());
+        else if (arg == "--mine-frames") mine.frames = heldOutMine.frames = std::stoi(value());
+        else if (arg == "--mine-step") mine.frameStep = heldOutMine.frameStep = std::stoi(value());
+        else if (arg == "--mine-jitter") mine.jitter = std::stoi(value());
+        else if (arg == "--heldout-mine-clips") heldOutMine.clips = std::stoi(value());
+        else if (arg == "--heldout-mine-seed") heldOutMine.seed = std::stoull(value());
+        else if (arg == "--mined-cache") minedCache = value();
+        else if (arg == "--mined-repeat") minedRepeat = std::stoi(value());
+        else if (arg == "--ring-dir") setRingDirectory(value() + "/");
         else if (arg == "--evaluate") evaluateOnly = true;
         else if (arg == "--set") {
             if (!handgen::setVariation(data.variation, value(), error)) return usage(error.c_str());
@@ -151,6 +173,30 @@ int main(int argc, char** argv) {
     }
     if (out.empty()) return usage("--out is required");
     train.seed = data.seed;
+    mine.threads = heldOutMine.threads = data.threads;
+    // held-out hits are scored as they are, without the tracker-like copies
+    heldOutMine.jitter = 0;
+    heldOutMine.maxNegativesPerFrame = 1000;
+    heldOutMine.variation = heldOut.variation;
+    // a mined set is read back from the cache when the same hits were mined before
+    auto mined = [&](const nntrain::MiningOptions& options, bool heldOutRanges, nntrain::MiningStats& stats) {
+        if (options.clips <= 0) return nntrain::PatchSet();
+        std::string path;
+        if (!minedCache.empty()) {
+            std::ostringstream name;
+            name << minedCache << "/" << recipe->name << "_s" << options.seed << "_c" << options.clips << "_f"
+                 << options.frames << "_k" << options.frameStep << "_j" << options.jitter << "_n"
+                 << options.maxNegativesPerFrame << (heldOutRanges ? "_heldout" : "") << ".bin";
+            path = name.str();
+            nntrain::PatchSet set;
+            if (nntrain::loadPatches(path, set, stats)) return set;
+        }
+        nntrain::PatchSet set = nntrain::minePatches(*recipe, options, stats);
+        if (!path.empty()) nntrain::savePatches(path, set, stats);
+        return set;
+    };
+    nntrain::MiningStats heldOutMineStats;
+    auto mineHeldOut = [&] { return mined(heldOutMine, true, heldOutMineStats); };
 
     if (evaluateOnly) {
         // the written model through the runtime's reader and its own forward pass
@@ -173,6 +219,21 @@ int main(int argc, char** argv) {
         print("runtime accuracy " + std::to_string(double(correct) / std::max<size_t>(1, p.size())) + " on " +
               std::to_string(p.size()) + " held-out patches");
         report(*recipe, heldOutSet, p, print);
+        const nntrain::PatchSet minedSet = mineHeldOut();
+        if (!minedSet.labels.empty()) {
+            print("mined held-out hits: " + heldOutMineStats.describe());
+            std::vector<float> q(minedSet.labels.size());
+            int right = 0;
+            for (size_t i = 0; i < q.size(); ++i) {
+                std::copy(minedSet.inputs.sample(static_cast<int>(i)),
+                          minedSet.inputs.sample(static_cast<int>(i)) + minedSet.inputs.volume(), input.data());
+                const std::vector<float> o = loaded.detect(input);
+                q[i] = nntrain::secondClassProbability(o.data());
+                right += (o[1] > o[0]) == (minedSet.labels[i] == 1);
+            }
+            print("runtime accuracy on mined held-out hits " + std::to_string(double(right) / std::max<size_t>(1, q.size())));
+            report(*recipe, minedSet, q, print);
+        }
         return 0;
     }
     std::ofstream logFile(out + "/" + recipe->name + ".log");
@@ -182,11 +243,21 @@ int main(int argc, char** argv) {
     };
     log("command: " + command.str());
     const auto t0 = std::chrono::steady_clock::now();
-    const nntrain::PatchSet trainSet = nntrain::makePatches(*recipe, data);
+    const nntrain::PatchSet synthetic = nntrain::makePatches(*recipe, data);
     const nntrain::PatchSet heldOutSet = nntrain::makePatches(*recipe, heldOut);
+    nntrain::MiningStats mineStats;
+    const nntrain::PatchSet minedTraining = mined(mine, false, mineStats);
+    const nntrain::PatchSet minedHeldOut = mineHeldOut();
+    // the hits count minedRepeat times against the synthetic patches
+    nntrain::PatchSet trainSet = synthetic;
+    for (int r = 0; r < minedRepeat; ++r) trainSet = nntrain::concatenate(trainSet, minedTraining);
     const double dataSeconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - t0).count();
-    log("patches: " + std::to_string(trainSet.labels.size()) + " training, " + std::to_string(heldOutSet.labels.size()) +
-        " held out, " + std::to_string(dataSeconds) + " s");
+    log("patches: " + std::to_string(synthetic.labels.size()) + " synthetic and " + std::to_string(minedTraining.labels.size()) +
+        " mined (counted " + std::to_string(minedRepeat) + " times) for training, " + std::to_string(heldOutSet.labels.size()) + " synthetic and " +
+        std::to_string(minedHeldOut.labels.size()) + " mined held out, " + std::to_string(dataSeconds) + " s");
+    if (mine.clips > 0) log("mined training hits (seed " + std::to_string(mine.seed) + "): " + mineStats.describe());
+    if (heldOutMine.clips > 0)
+        log("mined held-out hits (seed " + std::to_string(heldOutMine.seed) + "): " + heldOutMineStats.describe());
     std::ostringstream variation;
     variation << "held-out variation:\n" << handgen::describeVariation(heldOut.variation);
     logFile << variation.str();
@@ -196,7 +267,9 @@ int main(int argc, char** argv) {
     Tee tee(std::cout.rdbuf(), logFile.rdbuf());
     std::ostream trainLog(&tee);
     const auto t1 = std::chrono::steady_clock::now();
-    nntrain::train(net, trainSet, train, trainLog, &heldOutSet, recipe->threshold);
+    // the epochs are followed on the hits the chain will see, when there are any
+    const nntrain::PatchSet& watched = minedHeldOut.labels.empty() ? heldOutSet : minedHeldOut;
+    nntrain::train(net, trainSet, train, trainLog, &watched, recipe->threshold);
     const double trainSeconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - t1).count();
     log("training time " + std::to_string(trainSeconds) + " s");
     const nntrain::Evaluation trainScore = nntrain::evaluate(net, trainSet, recipe->threshold);
@@ -205,6 +278,10 @@ int main(int argc, char** argv) {
     log("held-out set: " + describe(heldScore, recipe->threshold));
 
     report(*recipe, heldOutSet, nntrain::probabilities(net, heldOutSet), log);
+    if (!minedHeldOut.labels.empty()) {
+        log("mined held-out hits: " + describe(nntrain::evaluate(net, minedHeldOut, recipe->threshold), recipe->threshold));
+        report(*recipe, minedHeldOut, nntrain::probabilities(net, minedHeldOut), log);
+    }
 
     NnDetector exported = nntrain::exportNetwork(net, recipe->name, recipe->mode);
     exported.setTrainLog(command.str() + "\nheld-out: " + describe(heldScore, recipe->threshold));
@@ -221,15 +298,20 @@ int main(int argc, char** argv) {
     loaded.setInputColorMode(recipe->mode);
     nntrain::Tensor one(1, heldOutSet.inputs.c, heldOutSet.inputs.h, heldOutSet.inputs.w);
     double worst = 0;
-    for (int i = 0; i < std::min<int>(200, static_cast<int>(heldOutSet.labels.size())); ++i) {
-        std::copy(heldOutSet.inputs.sample(i), heldOutSet.inputs.sample(i) + one.volume(), one.v.begin());
-        const nntrain::Tensor& mine = net.forward(one);
-        Blob input(1, one.c, one.h, one.w);
-        std::copy(one.v.begin(), one.v.end(), input.data());
-        const std::vector<float> theirs = loaded.detect(input);
-        for (int k = 0; k < 2; ++k) worst = std::max(worst, std::fabs(static_cast<double>(theirs[k]) - mine.v[k]));
-    }
-    log("largest score difference between trainer and loaded model over 200 patches: " + [&] { std::ostringstream s; s << worst; return s.str(); }());
+    int compared = 0;
+    for (const nntrain::PatchSet* set : {&heldOutSet, &minedHeldOut})
+        for (int i = 0; i < std::min<int>(200, static_cast<int>(set->labels.size())); ++i, ++compared) {
+            std::copy(set->inputs.sample(i), set->inputs.sample(i) + one.volume(), one.v.begin());
+            const nntrain::Tensor& ours = net.forward(one);
+            Blob input(1, one.c, one.h, one.w);
+            std::copy(one.v.begin(), one.v.end(), input.data());
+            const std::vector<float> theirs = loaded.detect(input);
+            for (int k = 0; k < 2; ++k) worst = std::max(worst, std::fabs(static_cast<double>(theirs[k]) - ours.v[k]));
+        }
+    std::ostringstream difference;
+    difference << worst;
+    log("largest score difference between trainer and loaded model over " + std::to_string(compared) +
+        " held-out patches: " + difference.str());
     if (recipe->shape != nntrain::Shape::Small && !exported.saveToCpp(out + "/" + recipe->name + ".cpp"))
         return usage("cannot write the generated source");
     return 0;

@@ -1,15 +1,20 @@
 // The verifier trainer: each layer's backward pass against finite differences, a small
-// problem learnt, and trained networks exported and read back through the model reader
-// giving the trainer's scores.
+// problem learnt, trained networks exported and read back through the model reader
+// giving the trainer's scores, and patches mined from cascade hits: their labels against
+// the ground truth and their cut against the chain's own network step.
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cmath>
+#include <cstdio>
 #include <random>
 #include <sstream>
 
 #include "LQ_ArchiveI.h"
 #include "LQ_ArchiveO.h"
+#include "LQ_ColorModeData.h"
+#include "MinedPatches.h"
+#include "NnTracker.h"
 #include "Trainer.h"
 
 using namespace nntrain;
@@ -258,4 +263,125 @@ TEST(NnTrain, PatchesAreRepeatableAndLabelled) {
     const Recipe& victory = *findRecipe("victory_verifier_face_pos_color_2017_12_14__iter_39000");
     EXPECT_EQ(makePatches(victory, options).inputs.c, 3);
     EXPECT_EQ(findRecipe("no such network"), nullptr);
+}
+
+TEST(NnTrain, MinedHitsAreLabelledAgainstTheTruth) {
+    EXPECT_FLOAT_EQ(overlap({0, 0, 10, 10}, {5, 0, 15, 10}), 50.f / 150.f);
+    EXPECT_EQ(overlap({0, 0, 10, 10}, {10, 0, 20, 10}), 0.f);
+    using handgen::Gesture;
+    const std::vector<TruthHand> hands = {{Gesture::Fist, {100, 100, 180, 190}},
+                                          {Gesture::Pointer, {300, 40, 380, 240}},
+                                          {std::nullopt, {450, 100, 530, 200}}};
+    // on the fist, a little off and smaller: still its hand
+    EXPECT_EQ(labelHit({104, 110, 176, 186}, hands, Gesture::Fist), HitLabel::Positive);
+    // the curled lower part of the pointer hand, the fist ring's favourite mistake
+    EXPECT_EQ(labelHit({300, 150, 380, 240}, hands, Gesture::Fist), HitLabel::Negative);
+    // the background
+    EXPECT_EQ(labelHit({10, 10, 60, 60}, hands, Gesture::Fist), HitLabel::Negative);
+    // well off the fist (overlap 0.23): neither its hand nor clear of it
+    EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist), HitLabel::Dropped);
+    // what the evaluation counts as found (overlap 1/3) is positive
+    EXPECT_EQ(labelHit({140, 100, 220, 190}, hands, Gesture::Fist), HitLabel::Positive);
+    // a hand of unknown shape (changing, or mostly out of the frame) may be a fist
+    EXPECT_EQ(labelHit({450, 100, 530, 200}, hands, Gesture::Fist), HitLabel::Dropped);
+    // the same hits for the pointer: its own hand positive, the fist negative
+    EXPECT_EQ(labelHit({300, 40, 380, 240}, hands, Gesture::Pointer), HitLabel::Positive);
+    EXPECT_EQ(labelHit({104, 110, 176, 186}, hands, Gesture::Pointer), HitLabel::Negative);
+    // the thresholds are the overlaps themselves
+    EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist, 0.2f), HitLabel::Positive);
+    EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist, 0.4f, 0.3f), HitLabel::Negative);
+}
+
+TEST(NnTrain, MinedPatchesAreCutAsTheChainCutsThem) {
+    // a fist clip frame through the camera's conversion and the fist ring; every hit's
+    // mined input must give the score the chain's network step gives on the same frame
+    handgen::ClipSetup setup;
+    setup.width = 640, setup.height = 360, setup.frames = 60, setup.seed = 5;
+    setup.gestures = {handgen::Gesture::Fist};
+    const handgen::ClipMaker maker(setup);
+    int frame = 0;
+    while (frame < setup.frames && !maker.truth(frame).gesture) ++frame;
+    ASSERT_LT(frame, setup.frames);
+    std::vector<std::uint8_t> rgb;
+    maker.render(frame, rgb);
+    const LQ::Image bgr = workingImage(rgb, setup.width, setup.height);
+    ASSERT_EQ(bgr.size(), LQ::BaseSize<int>(320, 180));
+    const handgen::FrameTruth t = maker.truth(frame);
+    const std::vector<TruthHand> truth = {{t.gesture, {t.rect[0] / 2, t.rect[1] / 2, t.rect[2] / 2, t.rect[3] / 2}}};
+
+    for (const char* name : {"fist_verifier_iter_135000", "victory_verifier_face_pos_color_2017_12_14__iter_39000"}) {
+        SCOPED_TRACE(name);
+        const Recipe& recipe = *findRecipe(name);
+        const TriggerSetup* trigger = triggerFor(recipe);
+        ASSERT_NE(trigger, nullptr);
+        LQ::Image chainImage;
+        std::vector<Hit> hits = mineFrame(recipe, *trigger, bgr, truth, chainImage);
+        if (recipe.gesture == handgen::Gesture::Fist) {
+            ASSERT_FALSE(hits.empty());
+            EXPECT_TRUE(std::any_of(hits.begin(), hits.end(), [](const Hit& h) { return h.label == HitLabel::Positive; }));
+        }
+        for (const Hit& hit : hits) EXPECT_EQ(hit.label, labelHit(hit.reported, truth, recipe.gesture));
+        // a hit of our own too, turned and near the border, so that the patch leaves the image
+        Hit own;
+        own.location = LQ::ObjectLocation(LQ::BasePoint<float>(20, 30), LQ::BaseSize<float>(40, 40), 30, LQ::Side::LEFT);
+        hits.push_back(own);
+
+        Net net = makeNet(recipe);
+        net.initialise(3);
+        NnDetector network = exportNetwork(net, recipe.name, recipe.mode);
+        network.setInputColorMode(recipe.mode);
+        // the engine's nodes: the BGR frame, its mono for the mono networks
+        LQ::SharedPtr<LQ::ImageData> source(new LQ::ImageData());
+        source->set(bgr);
+        LQ::SharedPtr<LQ::ImageData> image = source;
+        if (recipe.mode == LQ::COLOR_MODE_MONO) image = LQ::SharedPtr<LQ::ImageData>(new LQ::ColorModeData(source, LQ::COLOR_MODE_MONO));
+        NnTracker step(NnTracker::Parameters(NnTracker::Type::VERIFIER, LQ::SharedPtr<NnDetector>(&network, false), image,
+                                             recipe.relative(), recipe.threshold));
+        Blob blob;
+        for (const Hit& hit : hits) {
+            LQ::SharedPtr<LQ::StateAggregator> state = LQ::StateAggregator::newDetectorState();
+            static_cast<LQ::ObjectLocation&>(state->get<LQ::LocationState>()) = hit.location;
+            step.detect(state);
+            const float chainScore = state->get<LQ::ScoreState>();
+            network.convert(cutPatch(recipe, chainImage, hit.location), blob, 0, 1);
+            const std::vector<float> o = network.detect(blob);
+            EXPECT_EQ(secondClassProbability(o.data()), chainScore);
+        }
+    }
+
+    // the mined set follows from the seed, whatever the number of workers
+    MiningOptions options;
+    options.clips = 2, options.frames = 40, options.frameStep = 10, options.width = 640, options.height = 360;
+    options.jitter = 1;
+    options.maxNegativesPerFrame = 1000;
+    options.seed = 8;
+    const Recipe& fist = *findRecipe("fist_verifier_iter_135000");
+    MiningStats one, two;
+    const PatchSet a = minePatches(fist, options, one);
+    options.threads = 2;
+    const PatchSet b = minePatches(fist, options, two);
+    EXPECT_EQ(a.inputs.v, b.inputs.v);
+    EXPECT_EQ(a.labels, b.labels);
+    EXPECT_EQ(one.frames, 8);
+    // each kept hit and its one moved copy
+    EXPECT_EQ(static_cast<long>(a.labels.size()), 2 * (one.positives + one.negatives));
+    EXPECT_EQ(one.hits, one.positives + one.negatives + one.dropped);
+    // the cache gives the set and its figures back
+    const std::string path = ::testing::TempDir() + "mined_fist.bin";
+    savePatches(path, a, one);
+    PatchSet back;
+    MiningStats again;
+    ASSERT_TRUE(loadPatches(path, back, again));
+    EXPECT_EQ(back.inputs.v, a.inputs.v);
+    EXPECT_EQ(back.labels, a.labels);
+    EXPECT_EQ(back.kinds, a.kinds);
+    EXPECT_EQ(again.describe(), one.describe());
+    EXPECT_FALSE(loadPatches(path + ".missing", back, again));
+    std::remove(path.c_str());
+    DataOptions few;
+    few.positives = few.negatives = 2;
+    const PatchSet both = concatenate(a, makePatches(fist, few));
+    EXPECT_EQ(both.inputs.n, a.inputs.n + 4);
+    EXPECT_EQ(both.labels.size(), a.labels.size() + 4);
+    EXPECT_TRUE(std::equal(a.inputs.v.begin(), a.inputs.v.end(), both.inputs.v.begin()));
 }
