@@ -3,7 +3,7 @@
 # writes each as NAME.nn (the palm verifiers also as NAME.cpp) with NAME.log beside it.
 #   models/networks/train.sh [BUILD_DIR] [NAME...]
 # Held-out patches come from another seed and wider ranges of skin, noise, blur and turn.
-# The fist and victory verifiers also learn from the hits of their chain's trigger on
+# The fist, victory and pointer verifiers also learn from the hits of their chain's trigger on
 # generated clips (--mine-*), and are scored on hits mined from clips of other seeds.
 # MINED_CACHE=DIR keeps the mined sets there for another run (the result doesn't change).
 set -e
@@ -28,6 +28,7 @@ run fist_verifier_iter_135000 --seed 13 --positives 3000 --negatives 6000 --held
 run thumbUp_verifier_iter_55000 --seed 14 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
 run victory_verifier_face_pos_color_2017_12_14__iter_39000 --seed 15 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10 \
     $mined --mine-clips 40 --mine-seed 115 --heldout-mine-seed 9115 --mined-repeat 2
-run pointer_verifier__iter_18000 --seed 16 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
+run pointer_verifier__iter_18000 --seed 16 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10 \
+    $mined --mine-clips 40 --mine-seed 116 --heldout-mine-seed 9116 --mined-repeat 2 --ring-dir "$here/../rings"
 run pointer_hand_side__iter_7500 --seed 17 --positives 6000 --negatives 6000 --heldout-positives 2250 --heldout-negatives 2250 --epochs 10
 run heart_verifier_vent_iter_60000 --seed 18 --positives 4000 --negatives 8000 --heldout-positives 1500 --heldout-negatives 3000 --epochs 10
