@@ -376,24 +376,19 @@ struct TrainedFixture {
     }
 };
 
-// The compiled fist ring: what a fist trigger frame's scan costs with trained tables.
-void BM_TrainedFistRingFullFrame(benchmark::State& state) {
-    static TrainedFixture f(ada_Fist_2013_10_02__16_45_30());
-    for (auto _ : state) f.frame();
-    state.counters["windows"] = f.reaching[0];
-    for (size_t s = 1; s < f.reaching.size(); ++s)
-        state.counters["pass" + std::to_string(s)] = f.reaching[s] / f.reaching[s - 1];
+// A compiled ring: what a trigger frame's scan costs with trained tables.
+void BM_TrainedRingFullFrame(benchmark::State& state, ClassifierRing* (*ring)()) {
+    static std::map<ClassifierRing* (*)(), std::unique_ptr<TrainedFixture>> fixtures;
+    std::unique_ptr<TrainedFixture>& f = fixtures[ring];
+    if (!f) f.reset(new TrainedFixture(ring()));
+    for (auto _ : state) f->frame();
+    state.counters["windows"] = f->reaching[0];
+    for (size_t s = 1; s < f->reaching.size(); ++s)
+        state.counters["pass" + std::to_string(s)] = f->reaching[s] / f->reaching[s - 1];
 }
-BENCHMARK(BM_TrainedFistRingFullFrame)->Unit(benchmark::kMicrosecond);
-
-void BM_TrainedThumbUpRingFullFrame(benchmark::State& state) {
-    static TrainedFixture f(ada_thumbUp_ada__2017_11_13__20_01_17());
-    for (auto _ : state) f.frame();
-    state.counters["windows"] = f.reaching[0];
-    for (size_t s = 1; s < f.reaching.size(); ++s)
-        state.counters["pass" + std::to_string(s)] = f.reaching[s] / f.reaching[s - 1];
-}
-BENCHMARK(BM_TrainedThumbUpRingFullFrame)->Unit(benchmark::kMicrosecond);
+BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, fist, &ada_Fist_2013_10_02__16_45_30)->Unit(benchmark::kMicrosecond);
+BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, thumbUp, &ada_thumbUp_ada__2017_11_13__20_01_17)
+    ->Unit(benchmark::kMicrosecond);
 
 #if defined(TACTUS_WITH_OPENCV_OBJDETECT)
 void BM_OpenCvLbpFaceCascade(benchmark::State& state) {

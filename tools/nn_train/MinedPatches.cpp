@@ -74,14 +74,6 @@ const TriggerSetup* triggerFor(const Recipe& recipe) {
     }
 }
 
-float overlap(const Rect& a, const Rect& b) {
-    const float w = std::min(a[2], b[2]) - std::max(a[0], b[0]);
-    const float h = std::min(a[3], b[3]) - std::max(a[1], b[1]);
-    const float areaA = (a[2] - a[0]) * (a[3] - a[1]), areaB = (b[2] - b[0]) * (b[3] - b[1]);
-    if (w <= 0 || h <= 0 || areaA <= 0 || areaB <= 0) return 0;
-    return w * h / (areaA + areaB - w * h);
-}
-
 HitLabel labelHit(const Rect& reported, const std::vector<TruthHand>& hands, Gesture gesture, float positiveOverlap,
                   float negativeOverlap) {
     bool near = false;

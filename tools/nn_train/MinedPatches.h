@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "Evaluation.h"
 #include "HandClip.h"
 #include "LQ_ImageData.h"
 #include "LQ_ObjectLocation.h"
@@ -31,12 +32,13 @@ const TriggerSetup* triggerFor(const Recipe& recipe);
 
 enum class HitLabel { Positive, Negative, Dropped };
 
-using Rect = std::array<float, 4>;  // left, top, right, bottom
+// rectangles and their overlap as the evaluation matches reports with the truth
+using evaluation::Rect;
+using evaluation::overlap;
 struct TruthHand {
     std::optional<handgen::Gesture> gesture;  // none while changing shape or mostly outside
     Rect rect;
 };
-float overlap(const Rect& a, const Rect& b);  // intersection over union
 
 // Positive when the reported rectangle overlaps a hand of the gesture by positiveOverlap
 // (what tactus_evaluate counts as a detection);
