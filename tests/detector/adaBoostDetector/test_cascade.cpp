@@ -346,63 +346,6 @@ TEST(CascadeScan, CascadeTurnsAndMirrorsComeBack) {
     EXPECT_TRUE(mirrored == reference);
 }
 
-// A layer's shared integral HOG gives every window the same block sums as its own, so the
-// scan finds the same objects with the same scores either way.
-TEST(CascadeScan, SharedLayerHogEqualsOneHogPerWindow) {
-    Image parent;
-    const Image view = randomView(70, 52, LQ::COLOR_MODE_MONO, 21, parent);
-    Image mono(view.size(), LQ::COLOR_MODE_MONO);
-    for (int y = 0; y < view.height(); ++y)
-        for (int x = 0; x < view.width(); ++x) mono.pixel(x, y)[0] = view.pixel(x, y)[0];
-    Features f(mono);
-    std::mt19937 random(4);
-    std::vector<std::vector<LQ::schar>> tables(12, std::vector<LQ::schar>(256));
-    for (auto& t : tables)
-        for (auto& v : t) v = static_cast<LQ::schar>(static_cast<int>(random() % 21) - 10);
-    std::vector<LQ::schar> all(256, 1);
-    CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(19, 17));
-    cascade.setName("hog");
-    StrongClassifier first, second;
-    WeakClassifierRmct any(BasePoint<int>(4, 4));
-    any.setData(all.data());
-    first.addRmctClassifier(any);
-    first.setThreshold(1);
-    for (auto& t : tables) {
-        const int x = 1 + random() % 8, y = 1 + random() % 7;
-        WeakClassifierHog hog;
-        hog.setBlock(BaseRect<int>(x, y, x + 9, y + 8));
-        hog.setCell(BaseRect<int>(x + 2, y + 1, x + 6, y + 5));
-        hog.setSector(random() % 6);
-        hog.setData(t.data());
-        second.addHogClassifier(hog);
-    }
-    second.setThreshold(0);
-    cascade.addStrongClassifier(first);
-    cascade.addStrongClassifier(second);
-    CascadedClassifier shared = cascade;
-
-    std::vector<AdaObject> own, fromLayer;
-    cascade.addMatches(f.rmct, mono, f.integral, own, 1.0f, 1);
-    LayerHog layerHog;
-    layerHog.bind(mono, BaseRect<int>(-5, -5, 100, 100));
-    shared.setLayerHog(&layerHog);
-    shared.addMatches(f.rmct, mono, f.integral, fromLayer, 1.0f, 1);
-    EXPECT_EQ(shared.hogComputations(), 1);
-    ASSERT_GT(own.size(), 10u);
-    ASSERT_LT(own.size(), static_cast<size_t>((70 - 19 + 1) * (52 - 17 + 1)));
-    ASSERT_EQ(fromLayer.size(), own.size());
-    for (size_t k = 0; k < own.size(); ++k) {
-        EXPECT_EQ(fromLayer[k].center, own[k].center);
-        EXPECT_EQ(fromLayer[k].score, own[k].score);
-    }
-    // back to one per window
-    shared.setLayerHog(nullptr);
-    fromLayer.clear();
-    shared.addMatches(f.rmct, mono, f.integral, fromLayer, 1.0f, 1);
-    EXPECT_EQ(fromLayer.size(), own.size());
-}
-
 namespace {
 
 // One window's stage sums from the classifiers' own rectangles and points: census bytes,
