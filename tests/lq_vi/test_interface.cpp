@@ -278,17 +278,11 @@ TEST(ViInterface, ParseImageNameTakesTheFirstWordAtTheStart) {
     EXPECT_EQ(ViInterface::parseImageName("mono16"), LQ::COLOR_MODE_MONO16);
     EXPECT_EQ(ViInterface::parseImageName("mono16_left"), LQ::COLOR_MODE_MONO16);
     EXPECT_EQ(ViInterface::parseImageName("monochrome"), LQ::COLOR_MODE_MONO);
-    EXPECT_EQ(ViInterface::parseImageName("bgr"), LQ::COLOR_MODE_BGR);
     EXPECT_EQ(ViInterface::parseImageName("bgr_camera"), LQ::COLOR_MODE_BGR);
     EXPECT_EQ(ViInterface::parseImageName("rgba"), LQ::COLOR_MODE_RGBA);
     EXPECT_EQ(ViInterface::parseImageName("rgb"), LQ::COLOR_MODE_RGB);
     EXPECT_EQ(ViInterface::parseImageName("float2"), LQ::COLOR_MODE_FLOAT2);
     EXPECT_EQ(ViInterface::parseImageName("float"), LQ::COLOR_MODE_FLOAT);
-    EXPECT_EQ(ViInterface::parseImageName("ushort2"), LQ::COLOR_MODE_USHORT2);
-    EXPECT_EQ(ViInterface::parseImageName("integral"), LQ::COLOR_MODE_INTEGRAL);
-    EXPECT_EQ(ViInterface::parseImageName("depth"), LQ::COLOR_MODE_DEPTH);
-    EXPECT_EQ(ViInterface::parseImageName("gradient"), LQ::COLOR_MODE_GRADIENT);
-    EXPECT_EQ(ViInterface::parseImageName("rmct"), LQ::COLOR_MODE_RMCT);
     EXPECT_EQ(ViInterface::parseImageName("yuv"), LQ::COLOR_MODE_YUV);
 
     for (const char* bad : {"xbgr", "", "mon", "BGR"}) {
@@ -300,12 +294,6 @@ TEST(ViInterface, ParseImageNameTakesTheFirstWordAtTheStart) {
 }
 
 TEST(ViInterface, ResultPrintForm) {
-    std::ostringstream empty;
-    empty << LQ::ViResult();
-    EXPECT_EQ(empty.str(),
-              "ViResult(\n\tgestures=vector[0]()\n\tfloats=vector[0]()\n\trects=vector[0]()\n\tpoints=vector[0]()"
-              "\n\tpoints3d=vector[0]()\n\tparameters=vector[0]()\n\timages=vector[0]()\n)");
-
     LQ::ViResult result = filledResult();
     result.gestures = {"a\"b"};
     result.floats = {0.1f, 1.0f / 3.0f};

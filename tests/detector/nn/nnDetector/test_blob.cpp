@@ -126,9 +126,7 @@ TEST(Blob, TextAndBinaryForms) {
 // The generated form: literals that read back the same floats, ten to a line.
 TEST(Blob, SourceForm) {
     EXPECT_EQ(floatLiteral(1.f), "1.f");
-    EXPECT_EQ(floatLiteral(0.5f), "0.5f");
     EXPECT_EQ(floatLiteral(1e-05f), "1e-05f");
-    EXPECT_EQ(floatLiteral(-3.f), "-3.f");
     const float awkward = 0.1f + 0.2f;
     EXPECT_EQ(std::strtof(floatLiteral(awkward).c_str(), nullptr), awkward);
 

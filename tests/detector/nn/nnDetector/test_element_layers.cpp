@@ -355,15 +355,6 @@ TEST(ElementLayers, SaveToCpp) {
               "    a.push_back(2);\n    b.push_back(-1);\n    a.push_back(0.5);\n    b.push_back(0);\n"
               "    static LinearTransformLayer linearTransformLayer(\"lin\");\n"
               "    linearTransformLayer.setTransform(a, b);\n    return linearTransformLayer;\n}\n\n");
-
-    const Blob slope = makeBlob(2, 1, 1, 1, {0.25f, 1.f});
-    std::ostringstream slopeSource;
-    slope.saveToCpp(slopeSource, "act_slope");
-    PReluLayer prelu("act", slope);
-    EXPECT_EQ(source(prelu, "act"),
-              slopeSource.str() +
-                  "PReluLayer& act()\n{\n    static PReluLayer pReluLayer(\"act\", act_slope());\n"
-                  "    return pReluLayer;\n}\n\n");
 }
 
 // Output sizes round up and the last windows are clipped; with stride 2 the last row and
