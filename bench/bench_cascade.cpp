@@ -225,6 +225,37 @@ struct Fixture {
     }
 };
 
+// Every layer the detector scans, each cascade cut after stage s with that stage letting
+// everything through: the windows that reach stage s + 1, over all layers and cascades.
+std::vector<double> countReaching(AdaBoostDetector& detector, LQ::ImagePyramidData& pyramid) {
+    std::vector<double> reaching;
+    for (const auto& entry : detector.classifierMap()) {
+        const float zoom = entry.first;
+        const LQ::Image& rmct = pyramid.getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get();
+        const LQ::Image& mono = pyramid.getByZoom(LQ::COLOR_MODE_MONO, zoom)->get();
+        const LQ::Image& integral = pyramid.getByZoom(LQ::COLOR_MODE_INTEGRAL, 1.f)->get();
+        for (const CascadedClassifier* whole : entry.second) {
+            const size_t stages = whole->stages().size();
+            if (reaching.size() < stages + 1) reaching.resize(stages + 1);
+            for (size_t s = 0; s <= stages; ++s) {
+                CascadedClassifier prefix(*whole);
+                prefix.stages().resize(std::max<size_t>(s, 1));
+                if (s == 0) prefix.setLastStageThreshold(INT_MIN);
+                std::vector<AdaObject> reached;
+                prefix.addMatches(rmct, mono, integral, reached, zoom, 2);
+                reaching[s] += static_cast<double>(reached.size());
+            }
+        }
+    }
+    return reaching;
+}
+
+// the share of the windows reaching each stage that pass it
+void reportPassShares(benchmark::State& state, const std::vector<double>& reaching) {
+    state.counters["windows"] = reaching[0];
+    for (size_t s = 1; s < reaching.size(); ++s) state.counters["pass" + std::to_string(s)] = reaching[s] / reaching[s - 1];
+}
+
 Fixture& fixture() {
     static Fixture f;
     return f;
@@ -237,7 +268,7 @@ void BM_TriggerScanFullFrame(benchmark::State& state) {
     size_t found = 0;
     for (auto _ : state) f.frame(true, found);
     state.counters["windows/s"] = benchmark::Counter(f.windows(), benchmark::Counter::kIsIterationInvariantRate);
-    state.counters["windows"] = f.windows();
+    reportPassShares(state, countReaching(*f.detector, *f.pyramid));
     state.counters["objects"] = static_cast<double>(found);
 }
 BENCHMARK(BM_TriggerScanFullFrame)->Unit(benchmark::kMicrosecond);
@@ -341,7 +372,7 @@ struct TrainedFixture {
             0.3f, LQ::SharedPtr<LQ::BaseDetector>(), LQ::SharedPtr<LQ::BaseDetector>(),
             LQ::SharedPtr<LQ::BaseDetector>(), LQ::RelativeLocation(1, LQ::BasePoint<float>(0, 0), 0, 0, 0), 1000));
         frame();
-        countReaching();
+        reaching = countReaching(*detector, *pyramid);
     }
 
     void frame() {
@@ -351,29 +382,6 @@ struct TrainedFixture {
         LQ::SharedPtr<LQ::StateAggregator> state = LQ::StateAggregator::newDetectorState();
         detector->detect(state);
     }
-
-    // every layer the detector scans, each cascade cut after stage s with that stage
-    // letting everything through: the windows that reach stage s + 1
-    void countReaching() {
-        for (const auto& entry : detector->classifierMap()) {
-            const float zoom = entry.first;
-            const LQ::Image& rmct = pyramid->getByZoom(LQ::COLOR_MODE_RMCT, zoom)->get();
-            const LQ::Image& mono = pyramid->getByZoom(LQ::COLOR_MODE_MONO, zoom)->get();
-            const LQ::Image& integral = pyramid->getByZoom(LQ::COLOR_MODE_INTEGRAL, 1.f)->get();
-            for (const CascadedClassifier* whole : entry.second) {
-                const size_t stages = whole->stages().size();
-                if (reaching.size() < stages + 1) reaching.resize(stages + 1);
-                for (size_t s = 0; s <= stages; ++s) {
-                    CascadedClassifier prefix(*whole);
-                    prefix.stages().resize(std::max<size_t>(s, 1));
-                    if (s == 0) prefix.setLastStageThreshold(INT_MIN);
-                    std::vector<AdaObject> reached;
-                    prefix.addMatches(rmct, mono, integral, reached, zoom, 2);
-                    reaching[s] += static_cast<double>(reached.size());
-                }
-            }
-        }
-    }
 };
 
 // A compiled ring: what a trigger frame's scan costs with trained tables.
@@ -382,12 +390,14 @@ void BM_TrainedRingFullFrame(benchmark::State& state, ClassifierRing* (*ring)())
     std::unique_ptr<TrainedFixture>& f = fixtures[ring];
     if (!f) f.reset(new TrainedFixture(ring()));
     for (auto _ : state) f->frame();
-    state.counters["windows"] = f->reaching[0];
-    for (size_t s = 1; s < f->reaching.size(); ++s)
-        state.counters["pass" + std::to_string(s)] = f->reaching[s] / f->reaching[s - 1];
+    reportPassShares(state, f->reaching);
 }
 BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, fist, &ada_Fist_2013_10_02__16_45_30)->Unit(benchmark::kMicrosecond);
 BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, thumbUp, &ada_thumbUp_ada__2017_11_13__20_01_17)
+    ->Unit(benchmark::kMicrosecond);
+BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, victory, &ada_mono_ada_staticVictory_2017_11_10__14_34_17)
+    ->Unit(benchmark::kMicrosecond);
+BENCHMARK_CAPTURE(BM_TrainedRingFullFrame, pointer, &ada_mono_ada_staticPointer0_2015_06_23__19_25_48)
     ->Unit(benchmark::kMicrosecond);
 
 #if defined(TACTUS_WITH_OPENCV_OBJDETECT)

@@ -2,12 +2,12 @@
 // ".ring" file, as generated source and with its training log.
 //
 //   cascade_train --ring fist --out models/rings [--seed 1] [--positives 3000]
-//       [--negatives 6000] [--stages 4] [--later 150] [--cascades 0,1,2] [--threads 2]
+//       [--negatives 6000] [--stages 4] [--first 0] [--later 150] [--cascades 0,1,2] [--threads 2]
 //       [--heldout-positives 1000] [--heldout-scenes 200] [--mining-rounds 40] [--smoothing 200]
 //       [--set name=low,high ...]
 //
-// The first three stages keep the reference layout's sizes; stages from the fourth on have
-// --later weak classifiers each.
+// The first three stages keep the reference layout's sizes, the first replaced by --first
+// where given; stages from the fourth on have --later weak classifiers each.
 
 #include <chrono>
 #include <cstdio>
@@ -127,6 +127,18 @@ int main(int argc, char** argv) {
     }
     const int stageCount = std::stoi(get("stages", "4"));
     const int later = std::stoi(get("later", "150"));
+    // A first stage larger than the reference's few tests ends more windows in the vector
+    // pass, which costs less than taking the many survivors through the second stage.
+    const int first = std::stoi(get("first", "0"));
+    if (first < 0 || stageCount < 1) fail("--first takes a count of weak classifiers, --stages at least 1");
+    const auto stageSizes = [&](const ctrain::CascadePlan& plan) {
+        std::vector<int> sizes;
+        for (int s = 0; s < stageCount; ++s)
+            sizes.push_back(s < 3 && s < static_cast<int>(plan.stageSizes.size()) ? plan.stageSizes[static_cast<size_t>(s)]
+                                                                                   : later);
+        if (first > 0) sizes[0] = first;
+        return sizes;
+    };
     std::vector<int> which = numbers(get("cascades", ""));
     if (which.empty())
         for (size_t i = 0; i < ring->cascades.size(); ++i) which.push_back(static_cast<int>(i));
@@ -146,11 +158,7 @@ int main(int argc, char** argv) {
         if (index < 0 || index >= static_cast<int>(ring->cascades.size())) fail("no such cascade");
         const ctrain::CascadePlan& plan = ring->cascades[static_cast<size_t>(index)];
         ctrain::TrainOptions cascadeOptions = options;
-        cascadeOptions.stageSizes.clear();
-        for (int s = 0; s < stageCount; ++s)
-            cascadeOptions.stageSizes.push_back(s < 3 && s < static_cast<int>(plan.stageSizes.size())
-                                                    ? plan.stageSizes[static_cast<size_t>(s)]
-                                                    : later);
+        cascadeOptions.stageSizes = stageSizes(plan);
         TeeBuffer tee(std::cout.rdbuf(), log.rdbuf());
         std::ostream cascadeLog(&tee);
         results.push_back(
@@ -181,12 +189,7 @@ int main(int argc, char** argv) {
     ClassifierRing trained(cascades);
     trained.setName(ring->name);
     ctrain::TrainOptions recorded = options;
-    recorded.stageSizes.clear();
-    const ctrain::CascadePlan& upright = ring->cascades[ring->cascades.size() > 1 ? 1 : 0];
-    for (int s = 0; s < stageCount; ++s)
-        recorded.stageSizes.push_back(s < 3 && s < static_cast<int>(upright.stageSizes.size())
-                                          ? upright.stageSizes[static_cast<size_t>(s)]
-                                          : later);
+    recorded.stageSizes = stageSizes(ring->cascades[ring->cascades.size() > 1 ? 1 : 0]);
     trained.setConfig(ctrain::ringConfig(*ring, recorded));
     trained.setLog("log\n" + log.str());
     const std::string stem = out + "/" + ring->name;

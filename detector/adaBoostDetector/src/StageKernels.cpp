@@ -158,6 +158,8 @@ inline void sums16(const unsigned char* p, int step, const CensusStage& stage, i
             codes = vld1q_u8(codeAt);
         } else if (step == 2) {
             codes = vld2q_u8(codeAt).val[0];
+        } else if (step == 3) {
+            codes = vld3q_u8(codeAt).val[0];
         } else {
             unsigned char gathered[16];
             gatherCodes(codeAt, step, 16, gathered);
@@ -247,7 +249,8 @@ __attribute__((target("avx2"))) inline __m256i lookup256(const LQ::schar* table,
 }
 
 // The census bytes of 32 windows in the order 0-7, 16-23, 8-15, 24-31 by 8-byte quarters:
-// the order of a 16-bit pack, which the byte unpacks in sums32 undo.
+// the order of a 16-bit pack, which the byte unpacks in sums32 undo. Steps 1 to 3, those of
+// the triggers and trackers, by vector loads; others byte by byte.
 __attribute__((target("avx2"))) inline __m256i loadCodes(const unsigned char* p, int step) {
     if (step == 1) return _mm256_permute4x64_epi64(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)), 0xD8);
     if (step == 2) {
@@ -256,6 +259,21 @@ __attribute__((target("avx2"))) inline __m256i loadCodes(const unsigned char* p,
         const __m256i b =
             _mm256_and_si256(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p + 32)), even);
         return _mm256_packus_epi16(a, b);
+    }
+    if (step == 3) {
+        // every third byte of 48: six from the first 16, five from each of the next two
+        const __m128i first = _mm_setr_epi8(0, 3, 6, 9, 12, 15, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1);
+        const __m128i second = _mm_setr_epi8(-1, -1, -1, -1, -1, -1, 2, 5, 8, 11, 14, -1, -1, -1, -1, -1);
+        const __m128i third = _mm_setr_epi8(-1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, 1, 4, 7, 10, 13);
+        const auto sixteen = [&](const unsigned char* q) __attribute__((target("avx2"))) {
+            const __m128i a = _mm_loadu_si128(reinterpret_cast<const __m128i*>(q));
+            const __m128i b = _mm_loadu_si128(reinterpret_cast<const __m128i*>(q + 16));
+            const __m128i c = _mm_loadu_si128(reinterpret_cast<const __m128i*>(q + 32));
+            return _mm_or_si128(_mm_or_si128(_mm_shuffle_epi8(a, first), _mm_shuffle_epi8(b, second)),
+                                _mm_shuffle_epi8(c, third));
+        };
+        const __m128i low = sixteen(p), high = sixteen(p + 48);
+        return _mm256_set_m128i(_mm_unpackhi_epi64(low, high), _mm_unpacklo_epi64(low, high));
     }
     alignas(32) unsigned char gathered[32];
     for (int q = 0; q < 4; ++q)

@@ -42,7 +42,7 @@ Result run(Kernel kernel, const std::vector<unsigned char>& row, int step, int c
 }  // namespace
 
 // Every variant passes the same windows with the same sums: odd counts (vector blocks and
-// scalar tails), steps 1 to 3, census rows that end right after the last byte read, random
+// scalar tails), steps 1 to 4, census rows that end right after the last byte read, random
 // and extreme tables, thresholds inside and outside the 16-bit range of the vector sums, and
 // the 255 / 256 tests around the vector limit.
 TEST(StageKernels, FirstStageVariantsEqualScalar) {
@@ -53,7 +53,7 @@ TEST(StageKernels, FirstStageVariantsEqualScalar) {
         for (auto& v : table) v = static_cast<LQ::schar>(random() % 256);
     std::vector<LQ::schar> highest(256, 127), lowest(256, -128);
     int nonTrivial = 0;
-    for (int step = 1; step <= 3; ++step)
+    for (int step = 1; step <= 4; ++step)
         for (int count = 1; count <= 140; count += 1 + count / 8)
             for (int testCount : {1, 3, 7, 30}) {
                 std::vector<CensusTest> tests(testCount);
@@ -161,7 +161,7 @@ StagesResult runStages(StagesKernel kernel, const std::vector<unsigned char>& ro
 }  // namespace
 
 // Every form of the several-stage kernel finds what the definition finds: the same windows,
-// last-stage sums and counts per stage, over 1 to 5 stages of 0 to 40 tests, steps 1 to 3,
+// last-stage sums and counts per stage, over 1 to 5 stages of 0 to 40 tests, steps 1 to 4,
 // counts that leave partial blocks, rows that end with the last byte read, thresholds that
 // let few, half or most windows through, and each stage refusing all in turn so blocks end at
 // every stage. Stages over 255 tests, whose sums would wrap in 16 bits, go the scalar way.
@@ -173,7 +173,7 @@ TEST(StageKernels, SeveralStagesEqualDefinition) {
         for (auto& v : table) v = static_cast<LQ::schar>(random() % 256);
     int cases = 0, partial = 0;
     std::vector<int> endAt(5, 0);
-    for (int step = 1; step <= 3; ++step)
+    for (int step = 1; step <= 4; ++step)
         for (int count = 1; count <= 150; count += 1 + count / 6)
             for (int stageCount : {1, 2, 3, 5}) {
                 std::vector<std::vector<CensusTest>> stages(stageCount);
