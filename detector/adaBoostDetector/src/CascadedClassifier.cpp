@@ -42,6 +42,7 @@ CascadedClassifier& CascadedClassifier::operator=(const CascadedClassifier& othe
     hogComputations_ = 0;
     layerHog_ = nullptr;
     denseRowShare_ = other.denseRowShare_;
+    layerHogShare_ = other.layerHogShare_;
     hogRowLength_ = other.hogRowLength_;
     return *this;
 }
@@ -322,6 +323,13 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
         for (int c = 0; c < listed && shared; ++c)
             shared = layerHog_->rect.contains(LQ::BaseRect<int>(list[c].x + hogRoi_.left, list[c].y + hogRoi_.top,
                                                                 list[c].x + hogRoi_.right, list[c].y + hogRoi_.bottom));
+        // Not made yet: the layer's costs its area, the windows' own their regions each. It is
+        // made once what the layer's cascades have spent on their own would pay for it, so
+        // that a layer never costs more than twice the cheaper way.
+        const double own = static_cast<double>(listed) * hogRoi_.area();
+        if (shared && !layerHog_->computed)
+            shared = layerHog_->ownArea + own >= layerHogShare_ * layerHog_->rect.area();
+        if (!shared && layerHog_) layerHog_->ownArea += own;
         if (shared) {
             const unsigned int* hog = windowHog(mono.data() + list[0].y * monoStride + list[0].x, list[0].x, list[0].y);
             const size_t width = static_cast<size_t>(layerHog_->rect.width()) + 1;
@@ -333,6 +341,8 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
             };
             for (; s < stages && listed > 0; ++s) listed = keepPassing(strongClassifiers[s], list, listed, withHog);
         } else {
+            LayerHog* layer = layerHog_;
+            layerHog_ = nullptr;
             int kept = 0;
             for (int c = 0; c < listed; ++c) {
                 Survivor w = list[c];
@@ -342,6 +352,7 @@ void CascadedClassifier::addMatchesStatic(const LQ::Image& rmct, const LQ::Image
                 if (!passesFrom(s, r, mono.data() + w.y * monoStride + w.x, i, w.x, w.y, w.score)) continue;
                 list[kept++] = w;
             }
+            layerHog_ = layer;
             listed = kept;
         }
     }

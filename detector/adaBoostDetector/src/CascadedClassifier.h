@@ -25,11 +25,13 @@ struct LayerHog {
         mono = &layer;
         rect = region.intersect(layer.rect());
         computed = false;
+        ownArea = 0;
     }
     const LQ::Image* mono = nullptr;
     LQ::BaseRect<int> rect;
     LQ::Image image;
     bool computed = false;
+    double ownArea = 0;  // of the windows' own integral HOGs made so far instead
 };
 
 class CascadedClassifier : public ClassifierProperties {
@@ -83,6 +85,9 @@ public:
     // its census stages at once rather than in lists. Results don't depend on it; tests and
     // benchmarks set 0 or above 1 to force one way.
     void setDenseRowShare(double share) { denseRowShare_ = share; }
+    // A layer's integral HOG is made once the windows reaching HOG cover this share of its
+    // area with their own regions; fewer take their own. 0: always the layer's.
+    void setLayerHogShare(double share) { layerHogShare_ = share; }
     const std::vector<StrongClassifier>& stages() const { return strongClassifiers; }
     std::vector<StrongClassifier>& stages() { return strongClassifiers; }
     const LQ::BaseRect<int>& getHogRoi() const { return hogRoi_; }
@@ -123,6 +128,7 @@ private:
     long long hogComputations_ = 0;
     LayerHog* layerHog_ = nullptr;
     double denseRowShare_ = kDenseRowShare;
+    double layerHogShare_ = 1.0;
     // row length the HOG offsets are made for at present
     int hogRowLength_ = 0;
     // a window still in the race, at its position in the layer, and its last stage sum

@@ -446,7 +446,7 @@ CascadedClassifier randomCascade(std::mt19937& random, const std::vector<std::ar
 // window-by-window evaluation from the classifiers' definitions finds: census-only first
 // stages (the vector kernel) and mixed ones, census, Haar and HOG stages after them, one and
 // two HOG stages, steps 1 to 3, zooms 1 and 1.2, odd layer sizes with a wider stride, and the
-// HOG from the layer's shared image or made per window. The census stages after the first go
+// HOG from the layer's shared image, made per window, or chosen by their costs. The census stages after the first go
 // in lists, densely for the row, or each way by the rows' shares; a stage of 300 tests is
 // beyond the dense kernel and ends its run of stages. Thresholds are set from the reference
 // sums so that some windows end at every stage and some pass them all.
@@ -504,18 +504,20 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                 ASSERT_FALSE(expected.empty());
                 hits += static_cast<int>(expected.size());
 
-                for (bool shared : {false, true})
+                // HOG per window, from the layer's image, or either by their costs
+                for (int hogWay : {0, 1, 2})
                 for (double denseShare : {2.0, 0.0, CascadedClassifier::kDenseRowShare}) {
                     CascadedClassifier scanned = cascade;
                     scanned.setDenseRowShare(denseShare);
                     LayerHog layerHog;
-                    if (shared) {
+                    if (hogWay) {
                         layerHog.bind(mono, mono.rect());
                         scanned.setLayerHog(&layerHog);
+                        if (hogWay == 1) scanned.setLayerHogShare(0.0);
                     }
                     std::vector<AdaObject> objects;
                     scanned.addMatches(rmct, mono, integral, objects, zoom, step);
-                    hogScans += shared && layerHog.computed;
+                    hogScans += hogWay == 1 && layerHog.computed;
                     ASSERT_EQ(objects.size(), expected.size())
                         << shape << " " << step << " " << zoom << " " << denseShare;
                     for (size_t k = 0; k < objects.size(); ++k) {
