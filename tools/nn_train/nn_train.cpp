@@ -204,34 +204,33 @@ int main(int argc, char** argv) {
         LQ::ArchiveI::load(out + "/" + recipe->name + ".nn", loaded);
         loaded.setInputColorMode(recipe->mode);
         const nntrain::PatchSet heldOutSet = nntrain::makePatches(*recipe, heldOut);
-        std::vector<float> p(heldOutSet.labels.size());
         Blob input(1, heldOutSet.inputs.c, heldOutSet.inputs.h, heldOutSet.inputs.w);
-        int correct = 0;
-        for (size_t i = 0; i < p.size(); ++i) {
-            std::copy(heldOutSet.inputs.sample(static_cast<int>(i)),
-                      heldOutSet.inputs.sample(static_cast<int>(i)) + heldOutSet.inputs.volume(), input.data());
-            const std::vector<float> o = loaded.detect(input);
-            p[i] = nntrain::secondClassProbability(o.data());
-            correct += (o[1] > o[0]) == (heldOutSet.labels[i] == 1);
-        }
+        // the loaded file's second-class probabilities on a set, and the share it gets right
+        const auto score = [&](const nntrain::PatchSet& set, double& accuracy) {
+            std::vector<float> probabilities(set.labels.size());
+            int correct = 0;
+            for (size_t i = 0; i < probabilities.size(); ++i) {
+                const float* sample = set.inputs.sample(static_cast<int>(i));
+                std::copy(sample, sample + set.inputs.volume(), input.data());
+                const std::vector<float> o = loaded.detect(input);
+                probabilities[i] = nntrain::secondClassProbability(o.data());
+                correct += (o[1] > o[0]) == (set.labels[i] == 1);
+            }
+            accuracy = double(correct) / std::max<size_t>(1, probabilities.size());
+            return probabilities;
+        };
+        double accuracy = 0;
+        const std::vector<float> p = score(heldOutSet, accuracy);
         auto print = [](const std::string& line) { std::cout << line << std::endl; };
         print("command: " + command.str());
-        print("runtime accuracy " + std::to_string(double(correct) / std::max<size_t>(1, p.size())) + " on " +
+        print("runtime accuracy " + std::to_string(accuracy) + " on " +
               std::to_string(p.size()) + " held-out patches");
         report(*recipe, heldOutSet, p, print);
         const nntrain::PatchSet minedSet = mineHeldOut();
         if (!minedSet.labels.empty()) {
             print("mined held-out hits: " + heldOutMineStats.describe());
-            std::vector<float> q(minedSet.labels.size());
-            int right = 0;
-            for (size_t i = 0; i < q.size(); ++i) {
-                std::copy(minedSet.inputs.sample(static_cast<int>(i)),
-                          minedSet.inputs.sample(static_cast<int>(i)) + minedSet.inputs.volume(), input.data());
-                const std::vector<float> o = loaded.detect(input);
-                q[i] = nntrain::secondClassProbability(o.data());
-                right += (o[1] > o[0]) == (minedSet.labels[i] == 1);
-            }
-            print("runtime accuracy on mined held-out hits " + std::to_string(double(right) / std::max<size_t>(1, q.size())));
+            const std::vector<float> q = score(minedSet, accuracy);
+            print("runtime accuracy on mined held-out hits " + std::to_string(accuracy));
             report(*recipe, minedSet, q, print);
         }
         return 0;
