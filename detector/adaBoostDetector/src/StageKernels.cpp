@@ -342,6 +342,120 @@ int firstStagePassesAvx2(const unsigned char* row, const unsigned char* end, int
     const CensusStage stage{tests, testCount, threshold};
     return censusStagesPassAvx2(row, end, step, count, &stage, 1, passed, sums, nullptr);
 }
+
+#define LQ_TARGET_VBMI __attribute__((target("avx512f,avx512bw,avx512vbmi,bmi2")))
+namespace {
+// 64 scores of one table: a two-register byte permute reads 128 entries by the low seven
+// bits of each code, once for each half of the table; the top bit chooses between them.
+LQ_TARGET_VBMI inline __m512i lookup256(const LQ::schar* table, __m512i codes) {
+    const __m512i* t = reinterpret_cast<const __m512i*>(table);
+    const __m512i low = _mm512_permutex2var_epi8(_mm512_loadu_si512(t), codes, _mm512_loadu_si512(t + 1));
+    const __m512i high = _mm512_permutex2var_epi8(_mm512_loadu_si512(t + 2), codes, _mm512_loadu_si512(t + 3));
+    return _mm512_mask_blend_epi8(_mm512_movepi8_mask(codes), low, high);
+}
+
+// The census bytes of 64 windows in order: steps 1 to 3 by vector loads and byte permutes,
+// others byte by byte.
+// byte j of the 64 windows at step 2 and at step 3, from two registers
+struct PermuteIndices {
+    alignas(64) unsigned char step2[64];
+    alignas(64) unsigned char step3First[64];
+    alignas(64) unsigned char step3Second[64];
+    PermuteIndices() {
+        for (int j = 0; j < 64; ++j) {
+            step2[j] = static_cast<unsigned char>(2 * j);
+            step3First[j] = static_cast<unsigned char>(3 * j);
+            step3Second[j] = static_cast<unsigned char>(3 * j - 64);
+        }
+    }
+};
+const PermuteIndices kPermute;
+
+LQ_TARGET_VBMI inline __m512i loadCodes64(const unsigned char* p, int step) {
+    if (step == 1) return _mm512_loadu_si512(p);
+    if (step == 2)
+        return _mm512_permutex2var_epi8(_mm512_loadu_si512(p), _mm512_load_si512(kPermute.step2),
+                                        _mm512_loadu_si512(p + 64));
+    if (step == 3) {
+        // windows 0-42 lie in the first 128 bytes, 43-63 in the 128 from byte 64
+        const __m512i middle = _mm512_loadu_si512(p + 64);
+        const __m512i first =
+            _mm512_permutex2var_epi8(_mm512_loadu_si512(p), _mm512_load_si512(kPermute.step3First), middle);
+        const __m512i second = _mm512_permutex2var_epi8(middle, _mm512_load_si512(kPermute.step3Second),
+                                                        _mm512_loadu_si512(p + 128));
+        return _mm512_mask_blend_epi8(~0ull << 43, first, second);
+    }
+    alignas(64) unsigned char gathered[64];
+    gatherCodes(p, step, 64, gathered);
+    return _mm512_load_si512(gathered);
+}
+
+// The 16-bit sums of one stage for the 64 windows whose first census bytes are p, p + step,
+// ...: by the unpacks within 16-byte lanes, low holds windows 16 L + 0-7 and high 16 L + 8-15
+// of each lane L. Two tests at a time, as in sums32.
+LQ_TARGET_VBMI inline void sums64(const unsigned char* p, int step, const CensusStage& stage, __m512i& low,
+                                  __m512i& high) {
+    const __m512i ones = _mm512_set1_epi8(1);
+    const CensusTest* tests = stage.tests;
+    low = high = _mm512_setzero_si512();
+    for (int t = 0; t < stage.testCount; t += 2) {
+        const __m512i a = lookup256(tests[t].table, loadCodes64(p + tests[t].offset, step));
+        const __m512i b = t + 1 < stage.testCount
+                              ? lookup256(tests[t + 1].table, loadCodes64(p + tests[t + 1].offset, step))
+                              : _mm512_setzero_si512();
+        low = _mm512_add_epi16(low, _mm512_maddubs_epi16(ones, _mm512_unpacklo_epi8(a, b)));
+        high = _mm512_add_epi16(high, _mm512_maddubs_epi16(ones, _mm512_unpackhi_epi8(a, b)));
+    }
+}
+
+[[maybe_unused]] constexpr int kFewLanes64 = 16;
+}  // namespace
+
+LQ_TARGET_VBMI int censusStagesPassAvx512(const unsigned char* row, const unsigned char* end, int step, int count,
+                                          const CensusStage* stages, int stageCount, int* passed, int* sums,
+                                          int* reached) {
+    const auto block = [&](int k, int first, int found) LQ_TARGET_VBMI {
+        const unsigned char* p = row + static_cast<ptrdiff_t>(k) * step;
+        uint64_t alive = ~0ull << first;
+        __m512i low = _mm512_setzero_si512(), high = low;
+        for (int s = 0; s < stageCount; ++s) {
+            sums64(p, step, stages[s], low, high);
+            const __m512i limit = _mm512_set1_epi16(clampedThreshold(stages[s].threshold));
+            alive &= _pdep_u64(_mm512_cmpge_epi16_mask(low, limit), 0x00FF00FF00FF00FFull) |
+                     _pdep_u64(_mm512_cmpge_epi16_mask(high, limit), 0xFF00FF00FF00FF00ull);
+            if (reached) reached[s] += __builtin_popcountll(alive);
+            if (!alive) return found;
+            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes64) {
+                int lanes[64], n = 0;
+                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctzll(alive);
+                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                  reached ? reached + s + 1 : nullptr);
+            }
+        }
+        alignas(64) short sum[64];
+        _mm512_store_si512(sum, low);
+        _mm512_store_si512(sum + 32, high);
+        for (; alive; alive &= alive - 1) {
+            const int j = __builtin_ctzll(alive);
+            passed[found] = k + j;
+            sums[found] = sum[(j & 8 ? 32 : 0) + (j >> 4) * 8 + (j & 7)];
+            ++found;
+        }
+        return found;
+    };
+    return overBlocks<64>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
+}
+
+int firstStagePassesAvx512(const unsigned char* row, const unsigned char* end, int step, int count,
+                           const CensusTest* tests, int testCount, int threshold, int* passed, int* sums) {
+    const CensusStage stage{tests, testCount, threshold};
+    return censusStagesPassAvx512(row, end, step, count, &stage, 1, passed, sums, nullptr);
+}
+
+bool haveAvx512Census() {
+    return __builtin_cpu_supports("avx512f") && __builtin_cpu_supports("avx512bw") &&
+           __builtin_cpu_supports("avx512vbmi") && __builtin_cpu_supports("bmi2");
+}
 #endif
 
 int censusStagesPass(const unsigned char* row, const unsigned char* end, int step, int count,
@@ -349,7 +463,9 @@ int censusStagesPass(const unsigned char* row, const unsigned char* end, int ste
 #if defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE)
     return censusStagesPassNeon(row, end, step, count, stages, stageCount, passed, sums, reached);
 #elif defined(LQ_HAVE_SSSE3)
-    static const auto kernel = __builtin_cpu_supports("avx2") ? censusStagesPassAvx2 : censusStagesPassScalar;
+    static const auto kernel = haveAvx512Census()             ? censusStagesPassAvx512
+                               : __builtin_cpu_supports("avx2") ? censusStagesPassAvx2
+                                                                : censusStagesPassScalar;
     return kernel(row, end, step, count, stages, stageCount, passed, sums, reached);
 #else
     return censusStagesPassScalar(row, end, step, count, stages, stageCount, passed, sums, reached);

@@ -28,6 +28,10 @@ int firstStagePassesNeon(const unsigned char* row, const unsigned char* end, int
 // only where the processor has AVX2
 int firstStagePassesAvx2(const unsigned char* row, const unsigned char* end, int step, int count,
                          const CensusTest* tests, int testCount, int threshold, int* passed, int* sums);
+// only where the processor has AVX-512 with byte permutes (VBMI) and BMI2: haveAvx512Census
+int firstStagePassesAvx512(const unsigned char* row, const unsigned char* end, int step, int count,
+                           const CensusTest* tests, int testCount, int threshold, int* passed, int* sums);
+bool haveAvx512Census();
 #endif
 // the fastest of them on this processor
 int firstStagePasses(const unsigned char* row, const unsigned char* end, int step, int count,
@@ -59,6 +63,9 @@ int censusStagesPassNeon(const unsigned char* row, const unsigned char* end, int
 // only where the processor has AVX2
 int censusStagesPassAvx2(const unsigned char* row, const unsigned char* end, int step, int count,
                          const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
+// only where haveAvx512Census
+int censusStagesPassAvx512(const unsigned char* row, const unsigned char* end, int step, int count,
+                           const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
 #endif
 // the fastest of them on this processor
 int censusStagesPass(const unsigned char* row, const unsigned char* end, int step, int count,

@@ -12,7 +12,7 @@ namespace {
 
 using Kernel = decltype(&firstStagePassesScalar);
 
-// scalar first, then NEON (SIMDe on x86) and AVX2 where they exist
+// scalar first, then NEON (SIMDe on x86), AVX2 and AVX-512 where they exist
 std::vector<Kernel> kernels() {
     std::vector<Kernel> all{firstStagePassesScalar};
 #if defined(LQ_HAVE_NEON)
@@ -20,6 +20,7 @@ std::vector<Kernel> kernels() {
 #endif
 #if defined(LQ_HAVE_SSSE3)
     if (__builtin_cpu_supports("avx2")) all.push_back(firstStagePassesAvx2);
+    if (haveAvx512Census()) all.push_back(firstStagePassesAvx512);
 #endif
     return all;
 }
@@ -75,6 +76,7 @@ std::vector<StagesKernel> stagesKernels() {
 #endif
 #if defined(LQ_HAVE_SSSE3)
     if (__builtin_cpu_supports("avx2")) all.push_back(censusStagesPassAvx2);
+    if (haveAvx512Census()) all.push_back(censusStagesPassAvx512);
 #endif
     return all;
 }
