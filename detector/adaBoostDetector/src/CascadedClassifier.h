@@ -13,6 +13,7 @@
 #include "AdaObject.h"
 #include "ClassifierProperties.h"
 #include "LQ_Image.h"
+#include "StageKernels.h"
 #include "StrongClassifier.h"
 
 // The integral HOG of one rectangle of a layer, computed when the first window of any
@@ -36,9 +37,6 @@ struct LayerHog {
 
 class CascadedClassifier : public ClassifierProperties {
 public:
-    // Dense rows cost about the same whatever their share, lists grow with it; they cross
-    // near 30 % (bench_cascade's BM_CensusRowStages).
-    static constexpr double kDenseRowShare = 0.3;
     CascadedClassifier() = default;
     // a copy carries the run-time state, re-pointed at its own stages
     CascadedClassifier(const CascadedClassifier& other) : ClassifierProperties(other) { *this = other; }
@@ -127,7 +125,7 @@ private:
     const char* sharedName_ = "";
     long long hogComputations_ = 0;
     LayerHog* layerHog_ = nullptr;
-    double denseRowShare_ = kDenseRowShare;
+    double denseRowShare_ = denseCensusShare();
     double layerHogShare_ = 1.0;
     // row length the HOG offsets are made for at present
     int hogRowLength_ = 0;

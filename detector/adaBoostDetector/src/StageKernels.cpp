@@ -477,3 +477,10 @@ int firstStagePasses(const unsigned char* row, const unsigned char* end, int ste
     const CensusStage stage{tests, testCount, threshold};
     return censusStagesPass(row, end, step, count, &stage, 1, passed, sums, nullptr);
 }
+
+double denseCensusShare() {
+#if defined(LQ_HAVE_SSSE3) && !(defined(LQ_HAVE_NEON) && !defined(LQ_NEON_SIMDE))
+    if (haveAvx512Census()) return 0.2;
+#endif
+    return 0.3;
+}

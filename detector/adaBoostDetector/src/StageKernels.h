@@ -70,3 +70,9 @@ int censusStagesPassAvx512(const unsigned char* row, const unsigned char* end, i
 // the fastest of them on this processor
 int censusStagesPass(const unsigned char* row, const unsigned char* end, int step, int count,
                      const CensusStage* stages, int stageCount, int* passed, int* sums, int* reached);
+
+// The share of a row's windows passing the first stage from which the census stages after it
+// cost less taken densely by censusStagesPass than window by window. Dense rows cost about
+// the same whatever their share, lists grow with it; they cross near 30 % with 16 or 32
+// windows per block and near 20 % with 64 (bench_cascade's BM_CensusRowStages).
+double denseCensusShare();

@@ -506,7 +506,7 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
 
                 // HOG per window, from the layer's image, or either by their costs
                 for (int hogWay : {0, 1, 2})
-                for (double denseShare : {2.0, 0.0, CascadedClassifier::kDenseRowShare}) {
+                for (double denseShare : {2.0, 0.0, denseCensusShare()}) {
                     CascadedClassifier scanned = cascade;
                     scanned.setDenseRowShare(denseShare);
                     LayerHog layerHog;
