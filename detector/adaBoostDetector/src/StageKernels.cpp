@@ -354,8 +354,6 @@ LQ_TARGET_VBMI inline __m512i lookup256(const LQ::schar* table, __m512i codes) {
     return _mm512_mask_blend_epi8(_mm512_movepi8_mask(codes), low, high);
 }
 
-// The census bytes of 64 windows in order: steps 1 to 3 by vector loads and byte permutes,
-// others byte by byte.
 // byte j of the 64 windows at step 2 and at step 3, from two registers
 struct PermuteIndices {
     alignas(64) unsigned char step2[64];
@@ -371,6 +369,8 @@ struct PermuteIndices {
 };
 const PermuteIndices kPermute;
 
+// The census bytes of 64 windows in order: steps 1 to 3 by vector loads and byte permutes,
+// others byte by byte.
 LQ_TARGET_VBMI inline __m512i loadCodes64(const unsigned char* p, int step) {
     if (step == 1) return _mm512_loadu_si512(p);
     if (step == 2)
@@ -408,7 +408,7 @@ LQ_TARGET_VBMI inline void sums64(const unsigned char* p, int step, const Census
     }
 }
 
-[[maybe_unused]] constexpr int kFewLanes64 = 16;
+constexpr int kFewLanes64 = 16;
 }  // namespace
 
 LQ_TARGET_VBMI int censusStagesPassAvx512(const unsigned char* row, const unsigned char* end, int step, int count,
