@@ -112,6 +112,32 @@ int stagesScalar(const unsigned char* row, int step, int count, const CensusStag
     return found;
 }
 
+// A vector block's windows still in are the set bits of alive, window j at bit j * spacing.
+
+// The stages from the given one on, window by window, for the windows still in; returns found
+// with their passes appended.
+[[maybe_unused]] int finishFew(uint64_t alive, int spacing, const unsigned char* p, int step, int k,
+                               const CensusStage* stages, int stageCount, int* passed, int* sums, int found,
+                               int* reached) {
+    int lanes[64], n = 0;
+    for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctzll(alive) / spacing;
+    return fewWindows(p, step, k, lanes, n, stages, stageCount, passed, sums, found, reached);
+}
+
+// The windows still in after the last stage, with their sums sum[at(j)]; returns found with
+// them appended.
+template <class At>
+int appendPasses(uint64_t alive, int spacing, int k, const short* sum, const At& at, int* passed, int* sums,
+                 int found) {
+    for (; alive; alive &= alive - 1) {
+        const int j = __builtin_ctzll(alive) / spacing;
+        passed[found] = k + j;
+        sums[found] = sum[at(j)];
+        ++found;
+    }
+    return found;
+}
+
 // Blocks of width windows from the first, then the last windows in a block that overlaps
 // the one before, or the scalar loop where a block would read past end.
 // block(k, first, found) takes windows k .. k + width - 1, of which those before k + first
@@ -196,23 +222,14 @@ int censusStagesPassNeon(const unsigned char* row, const unsigned char* end, int
             alive &= vget_lane_u64(vreinterpret_u64_u8(vshrn_n_u16(vreinterpretq_u16_u8(pass), 4)), 0);
             if (reached) reached[s] += __builtin_popcountll(alive);
             if (!alive) return found;
-            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes16) {
-                int lanes[16], n = 0;
-                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctzll(alive) >> 2;
-                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
-                                  reached ? reached + s + 1 : nullptr);
-            }
+            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes16)
+                return finishFew(alive, 4, p, step, k, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                 reached ? reached + s + 1 : nullptr);
         }
         short sum[16];
         vst1q_s16(sum, low);
         vst1q_s16(sum + 8, high);
-        for (; alive; alive &= alive - 1) {
-            const int j = __builtin_ctzll(alive) >> 2;
-            passed[found] = k + j;
-            sums[found] = sum[j];
-            ++found;
-        }
-        return found;
+        return appendPasses(alive, 4, k, sum, [](int j) { return j; }, passed, sums, found);
     };
     return overBlocks<16>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
 }
@@ -316,23 +333,14 @@ __attribute__((target("avx2"))) int censusStagesPassAvx2(const unsigned char* ro
             alive &= ~static_cast<unsigned int>(_mm256_movemask_epi8(_mm256_permute4x64_epi64(fail, 0xD8)));
             if (reached) reached[s] += __builtin_popcount(alive);
             if (!alive) return found;
-            if (s + 1 < stageCount && __builtin_popcount(alive) <= kFewLanes32) {
-                int lanes[32], n = 0;
-                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctz(alive);
-                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
-                                  reached ? reached + s + 1 : nullptr);
-            }
+            if (s + 1 < stageCount && __builtin_popcount(alive) <= kFewLanes32)
+                return finishFew(alive, 1, p, step, k, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                 reached ? reached + s + 1 : nullptr);
         }
         alignas(32) short sum[32];
         _mm256_store_si256(reinterpret_cast<__m256i*>(sum), low);
         _mm256_store_si256(reinterpret_cast<__m256i*>(sum + 16), high);
-        for (; alive; alive &= alive - 1) {
-            const int j = __builtin_ctz(alive);
-            passed[found] = k + j;
-            sums[found] = sum[j];
-            ++found;
-        }
-        return found;
+        return appendPasses(alive, 1, k, sum, [](int j) { return j; }, passed, sums, found);
     };
     return overBlocks<32>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
 }
@@ -425,23 +433,16 @@ LQ_TARGET_VBMI int censusStagesPassAvx512(const unsigned char* row, const unsign
                      _pdep_u64(_mm512_cmpge_epi16_mask(high, limit), 0xFF00FF00FF00FF00ull);
             if (reached) reached[s] += __builtin_popcountll(alive);
             if (!alive) return found;
-            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes64) {
-                int lanes[64], n = 0;
-                for (; alive; alive &= alive - 1) lanes[n++] = __builtin_ctzll(alive);
-                return fewWindows(p, step, k, lanes, n, stages + s + 1, stageCount - s - 1, passed, sums, found,
-                                  reached ? reached + s + 1 : nullptr);
-            }
+            if (s + 1 < stageCount && __builtin_popcountll(alive) <= kFewLanes64)
+                return finishFew(alive, 1, p, step, k, stages + s + 1, stageCount - s - 1, passed, sums, found,
+                                 reached ? reached + s + 1 : nullptr);
         }
         alignas(64) short sum[64];
         _mm512_store_si512(sum, low);
         _mm512_store_si512(sum + 32, high);
-        for (; alive; alive &= alive - 1) {
-            const int j = __builtin_ctzll(alive);
-            passed[found] = k + j;
-            sums[found] = sum[(j & 8 ? 32 : 0) + (j >> 4) * 8 + (j & 7)];
-            ++found;
-        }
-        return found;
+        // low holds windows 16 L + 0-7 of each lane L, high 16 L + 8-15
+        const auto at = [](int j) { return (j & 8 ? 32 : 0) + (j >> 4) * 8 + (j & 7); };
+        return appendPasses(alive, 1, k, sum, at, passed, sums, found);
     };
     return overBlocks<64>(row, end, step, count, stages, stageCount, passed, sums, reached, block);
 }
