@@ -47,22 +47,16 @@ template <class F>
 std::string stderrOf(F f) {
     const std::string path = ::testing::TempDir() + "tactus_stderr_" + std::to_string(getpid());
     fflush(stderr);
-    const int saved = dup(2);
-    FILE* file = fopen(path.c_str(), "w");
-    dup2(fileno(file), 2);
-    try {
+    struct Redirect {  // restores stderr on the way out, also when f throws
+        int saved;
+        FILE* file;
+        ~Redirect() { fflush(stderr), dup2(saved, 2), close(saved), fclose(file); }
+    };
+    {
+        Redirect redirect{dup(2), fopen(path.c_str(), "w")};
+        dup2(fileno(redirect.file), 2);
         f();
-    } catch (...) {
-        fflush(stderr);
-        dup2(saved, 2);
-        close(saved);
-        fclose(file);
-        throw;
     }
-    fflush(stderr);
-    dup2(saved, 2);
-    close(saved);
-    fclose(file);
     std::ifstream in(path);
     std::stringstream text;
     text << in.rdbuf();
@@ -92,11 +86,19 @@ void start(const char* mode, const char* isFlip = "true") {
     VI_Tactus_Reset();
 }
 
-std::vector<Gesture> run(Frame& frame, const char* key = "orientation", const char* value = "0") {
+std::vector<Gesture> run(Frame& frame, const char* key = "orientation", const std::string& value = "0") {
     VI_Tactus_SetFrame(frame.nv21().data(), glyphModels::kCameraWidth, glyphModels::kCameraHeight * 3 / 2, 0);
-    if (key) VI_Tactus_SetFrameParameter(key, value);
+    if (key) VI_Tactus_SetFrameParameter(key, value.c_str());
     VI_Tactus_ProcessFrame();
     return results();
+}
+
+// up to eight frames of step, until one reports something
+template <class F>
+std::vector<Gesture> untilFound(F step) {
+    std::vector<Gesture> found;
+    for (int n = 0; n < 8 && found.empty(); ++n) found = step();
+    return found;
 }
 
 // the device turn of each orientation as the engine applies it: 0 degrees holds the camera
@@ -107,24 +109,30 @@ int turnsOf(int orientation, bool isFlip) {
     return isFlip ? t : (4 - t) % 4;
 }
 
-// the camera box of a square upright window, mirrored left to right for a front camera
-BaseRect<float> expectedBox(const Frame& frame, float left, float top, float size, bool isFlip) {
-    BaseRect<float> box = frame.cameraBox(BaseRect<float>(left, top, left + size, top + size));
-    if (isFlip) box = BaseRect<float>(glyphModels::kCameraWidth - box.right, box.top,
-                                      glyphModels::kCameraWidth - box.left, box.bottom);
-    return box;
+const float kScale = 2.f;                      // the glyph at twice its window: 48 pixels
+const float kSize = glyphs::kWindow * kScale;  // in the upright half-size image
+
+Frame fistFrame(int turns, float left = 100, float top = 80) {
+    Frame frame(turns);
+    frame.draw(glyphs::kF, left, top, kScale);
+    return frame;
 }
 
-void expectNear(const BaseRect<float>& got, const BaseRect<float>& want, const std::string& where) {
+// one gesture, whose rectangle is the camera box of the upright glyph window (mirrored
+// left to right for a front camera) within 15% of its size
+void expectOneAt(const std::vector<Gesture>& found, const Frame& frame, float left, float top, bool isFlip,
+                 const std::string& where) {
+    ASSERT_EQ(found.size(), 1u) << where;
+    BaseRect<float> want = frame.cameraBox(BaseRect<float>(left, top, left + kSize, top + kSize));
+    if (isFlip) want = BaseRect<float>(glyphModels::kCameraWidth - want.right, want.top,
+                                       glyphModels::kCameraWidth - want.left, want.bottom);
+    const BaseRect<float>& got = found[0].rect;
     const float tolerance = 0.15f * (want.right - want.left);
     EXPECT_NEAR(got.left, want.left, tolerance) << where;
     EXPECT_NEAR(got.top, want.top, tolerance) << where;
     EXPECT_NEAR(got.right, want.right, tolerance) << where;
     EXPECT_NEAR(got.bottom, want.bottom, tolerance) << where;
 }
-
-const float kScale = 2.f;                      // the glyph at twice its window: 48 pixels
-const float kSize = glyphs::kWindow * kScale;  // in the upright half-size image
 
 }  // namespace
 
@@ -157,21 +165,20 @@ TEST(EngineClip, UnknownModesAndTheHeartFailWithTheirTexts) {
     EXPECT_NO_THROW(run(frame));
 }
 
-// A fist that appears, moves and leaves: it is reported after its flags fill, follows
-// the glyph frame by frame in camera coordinates (turned back, mirrored, doubled), and
-// goes once the glyph has been away for the length of its history.
+// A fist that appears, moves and leaves: reported once its flags fill (the trigger runs
+// every fifth frame, three flags are needed), followed in camera coordinates, and dropped
+// once the glyph has been away for the length of its history.
 TEST(EngineClip, AFistIsReportedFollowedAndDropped) {
     start("fist");
     const int appear = 2, leave = 16, end = 26;
     int firstReport = -1, lastReport = -1;
     for (int n = 0; n < end; ++n) {
-        Frame frame(turnsOf(0, true));
         const float left = 120 + 3 * n, top = 300 - 2 * n;
-        if (n >= appear && n < leave) frame.draw(glyphs::kF, left, top, kScale);
+        Frame frame = n >= appear && n < leave ? fistFrame(turnsOf(0, true), left, top)
+                                               : Frame(turnsOf(0, true));
         const std::vector<Gesture> found = run(frame);
         ASSERT_LE(found.size(), 1u) << "frame " << n;
         if (found.empty()) {
-            // once reported it stays while the glyph is there
             EXPECT_FALSE(firstReport >= 0 && n < leave) << "lost on frame " << n;
             continue;
         }
@@ -185,9 +192,8 @@ TEST(EngineClip, AFistIsReportedFollowedAndDropped) {
         EXPECT_EQ(g.angle, 0.f);
         EXPECT_NE(g.keyRing.find("side "), std::string::npos);
         EXPECT_NE(g.keyRing.find("text "), std::string::npos);
-        if (n < leave) expectNear(g.rect, expectedBox(frame, left, top, kSize, true), "frame " + std::to_string(n));
+        if (n < leave) expectOneAt(found, frame, left, top, true, "frame " + std::to_string(n));
     }
-    // the trigger runs every fifth frame and three flags are needed
     ASSERT_GE(firstReport, appear + 2);
     EXPECT_LE(firstReport, appear + 5 + 2);
     EXPECT_GE(lastReport, leave - 1);
@@ -195,25 +201,20 @@ TEST(EngineClip, AFistIsReportedFollowedAndDropped) {
 }
 
 // Every orientation with a front and a back camera: the glyph drawn upright for the
-// device's turn is found, and its rectangle comes back where it is in the camera frame.
+// device's turn is found where it is in the camera frame; turned the wrong way it is not.
 TEST(EngineClip, EveryOrientationAndBothCameras) {
     for (const bool isFlip : {true, false}) {
         start("fist", isFlip ? "true" : "false");
         for (const int orientation : {0, 90, 180, 270}) {
-            VI_Tactus_Reset();
             const std::string where = "orientation " + std::to_string(orientation) + (isFlip ? " front" : " back");
-            Frame frame(turnsOf(orientation, isFlip));
-            frame.draw(glyphs::kF, 100, 80, kScale);
-            std::vector<Gesture> found;
-            for (int n = 0; n < 8 && found.empty(); ++n) found = run(frame, "orientation", std::to_string(orientation).c_str());
-            ASSERT_EQ(found.size(), 1u) << where;
-            expectNear(found[0].rect, expectedBox(frame, 100, 80, kSize, isFlip), where);
-            // the same glyph turned the wrong way isn't a fist
+            const std::string value = std::to_string(orientation);
             VI_Tactus_Reset();
-            Frame wrong((turnsOf(orientation, isFlip) + 1) % 4);
-            wrong.draw(glyphs::kF, 100, 80, kScale);
-            for (int n = 0; n < 8; ++n)
-                EXPECT_TRUE(run(wrong, "orientation", std::to_string(orientation).c_str()).empty()) << where;
+            Frame frame = fistFrame(turnsOf(orientation, isFlip));
+            const std::vector<Gesture> found = untilFound([&] { return run(frame, "orientation", value); });
+            expectOneAt(found, frame, 100, 80, isFlip, where);
+            VI_Tactus_Reset();
+            Frame wrong = fistFrame((turnsOf(orientation, isFlip) + 1) % 4);
+            for (int n = 0; n < 8; ++n) EXPECT_TRUE(run(wrong, "orientation", value).empty()) << where;
         }
     }
 }
@@ -222,44 +223,30 @@ TEST(EngineClip, EveryOrientationAndBothCameras) {
 // An orientation outside the four values empties that frame only.
 TEST(EngineClip, AccelerometerDefaultTurnAndBadOrientation) {
     start("fist");
-    Frame upright(0), sideways(1);
-    upright.draw(glyphs::kF, 100, 80, kScale);
-    sideways.draw(glyphs::kF, 100, 80, kScale);
-    std::vector<Gesture> found;
+    Frame upright = fistFrame(0), sideways = fistFrame(1);
     run(sideways, "orientation", "0");
     // gravity along x: no turn, but three readings are needed; with one the quarter turn stays
-    for (int n = 0; n < 8 && found.empty(); ++n) found = run(upright, "accelx", "9.8");
-    EXPECT_TRUE(found.empty());
-    for (int n = 0; n < 8 && found.empty(); ++n) {
-        VI_Tactus_SetFrameParameter("accely", "0");
-        VI_Tactus_SetFrameParameter("accelz", "0");
-        found = run(upright, "accelx", "9.8");
-    }
-    ASSERT_EQ(found.size(), 1u);
-    expectNear(found[0].rect, expectedBox(upright, 100, 80, kSize, true), "accelerometer, no turn");
-    // no data: the turn stays
-    EXPECT_EQ(run(upright, nullptr).size(), 1u);
-
+    EXPECT_TRUE(untilFound([&] { return run(upright, "accelx", "9.8"); }).empty());
+    const auto gravity = [&](Frame& frame, const char* x, const char* y, const char* z) {
+        return untilFound([&] {
+            VI_Tactus_SetFrameParameter("accelx", x);
+            VI_Tactus_SetFrameParameter("accely", y);
+            VI_Tactus_SetFrameParameter("accelz", z);
+            return run(frame, nullptr);
+        });
+    };
+    expectOneAt(gravity(upright, "9.8", "0", "0"), upright, 100, 80, true, "accelerometer, no turn");
+    EXPECT_EQ(run(upright, nullptr).size(), 1u);  // no data: the turn stays
     VI_Tactus_Reset();
-    found.clear();
-    for (int n = 0; n < 8 && found.empty(); ++n) {
-        VI_Tactus_SetFrameParameter("accelx", "0");
-        VI_Tactus_SetFrameParameter("accelz", "0.5");
-        found = run(sideways, "accely", "9.8");
-    }
-    ASSERT_EQ(found.size(), 1u);
-    expectNear(found[0].rect, expectedBox(sideways, 100, 80, kSize, true), "accelerometer, a quarter");
+    expectOneAt(gravity(sideways, "0", "9.8", "0.5"), sideways, 100, 80, true, "accelerometer, a quarter");
 
     std::string log = stderrOf([&] { EXPECT_TRUE(run(sideways, "orientation", "45").empty()); });
     EXPECT_NE(log.find("Unknown angle = 45, possible angles: 0, 90, 180, 270"), std::string::npos) << log;
     // 450 is 90
-    found.clear();
-    for (int n = 0; n < 8 && found.empty(); ++n) found = run(sideways, "orientation", "450");
-    Frame ninety(turnsOf(90, true));
-    ninety.draw(glyphs::kF, 100, 80, kScale);
-    for (int n = 0; n < 8 && found.empty(); ++n) found = run(ninety, "orientation", "450");
-    ASSERT_EQ(found.size(), 1u);
-    expectNear(found[0].rect, expectedBox(ninety, 100, 80, kSize, true), "orientation 450");
+    Frame ninety = fistFrame(turnsOf(90, true));
+    std::vector<Gesture> found = untilFound([&] { return run(sideways, "orientation", "450"); });
+    if (found.empty()) found = untilFound([&] { return run(ninety, "orientation", "450"); });
+    expectOneAt(found, ninety, 100, 80, true, "orientation 450");
 }
 
 // Turning the device from 0 to 180 degrees rebuilds the chain; the fist, upright in both,
@@ -269,13 +256,11 @@ TEST(EngineClip, ARebuildOnATurnKeepsTheObject) {
     int reported = 0;
     for (int n = 0; n < 20; ++n) {
         const int orientation = n < 10 ? 0 : 180;
-        Frame frame(turnsOf(orientation, true));
-        frame.draw(glyphs::kF, 150, 200, kScale);
-        const std::vector<Gesture> found = run(frame, "orientation", std::to_string(orientation).c_str());
+        Frame frame = fistFrame(turnsOf(orientation, true), 150, 200);
+        const std::vector<Gesture> found = run(frame, "orientation", std::to_string(orientation));
         if (reported == 0 && found.empty()) continue;
-        ASSERT_EQ(found.size(), 1u) << "frame " << n;
         ++reported;
-        expectNear(found[0].rect, expectedBox(frame, 150, 200, kSize, true), "frame " + std::to_string(n));
+        expectOneAt(found, frame, 150, 200, true, "frame " + std::to_string(n));
     }
     EXPECT_GE(reported, 12);
 }
@@ -284,16 +269,14 @@ TEST(EngineClip, ARebuildOnATurnKeepsTheObject) {
 // device's turn lays them on their side in the camera frame. A pointer needs the strict
 // verifier to be born; ours answers 0.5, so no pointer ever is.
 TEST(EngineClip, ResultBoxesTurnWithTheDeviceAndPointersNeedTheStrictVerifier) {
-    Frame frame(turnsOf(0, true));
-    frame.draw(glyphs::kF, 100, 200, kScale);
+    Frame frame = fistFrame(turnsOf(0, true), 100, 200);
     struct Box {
         const char* mode;
         float across, aspect;  // of the object's width, and height over width
     };
     for (const Box& box : {Box{"thumbUp", 0.9f, 1.9f}, Box{"victory", 0.7f, 2.2f}}) {
         start(box.mode);
-        std::vector<Gesture> found;
-        for (int n = 0; n < 8 && found.empty(); ++n) found = run(frame);
+        const std::vector<Gesture> found = untilFound([&] { return run(frame); });
         ASSERT_EQ(found.size(), 1u) << box.mode;
         EXPECT_EQ(found[0].name, box.mode);
         // in camera pixels, twice the half-size image

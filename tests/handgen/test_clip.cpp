@@ -56,8 +56,7 @@ TEST(HandClip, FilesHoldTheFramesInNv21AndY4m) {
 
     // the host program's reader gives NV21: luma, then V, U pairs
     Y4mClip clip(dir / "plain.y4m");
-    ASSERT_EQ(clip.width, 64);
-    ASSERT_EQ(clip.height, 48);
+    ASSERT_TRUE(clip.width == 64 && clip.height == 48);
     std::vector<unsigned char> frame;
     std::string frames;
     int count = 0;
@@ -101,14 +100,9 @@ TEST(HandClip, TruthAgreesWithTheFrames) {
         EXPECT_FALSE(untouched) << f;
         EXPECT_EQ(json.find("\"gestures\":[]"), std::string::npos) << json;
         const auto& rect = truth.rect;
-        EXPECT_GE(rect[0], 0) << f;
-        EXPECT_GE(rect[1], 0) << f;
-        EXPECT_LE(rect[2], setup.width) << f;
-        EXPECT_LE(rect[3], setup.height) << f;
-        EXPECT_LT(rect[0], rect[2]) << f;
-        EXPECT_LT(rect[1], rect[3]) << f;
-        EXPECT_GT(truth.visible, 0) << f;
-        EXPECT_LE(truth.visible, 1) << f;
+        EXPECT_TRUE(0 <= rect[0] && rect[0] < rect[2] && rect[2] <= setup.width) << f;
+        EXPECT_TRUE(0 <= rect[1] && rect[1] < rect[3] && rect[3] <= setup.height) << f;
+        EXPECT_TRUE(truth.visible > 0 && truth.visible <= 1) << f;
         if (truth.visible < 1) ++partial;
         if (truth.gesture) {
             ++labelled;
@@ -154,10 +148,7 @@ TEST(HandClip, BoxesAreClippedToTheFrame) {
     const std::vector<Point> corner = {{-10, -10}, {10, -10}, {10, 10}, {-10, 10}};
     const std::vector<Point> inside = clipToFrame(corner, 100, 50);
     EXPECT_NEAR(polygonArea(inside), 100, 1e-3);
-    for (const Point& p : inside) {
-        EXPECT_GE(p.x, 0);
-        EXPECT_GE(p.y, 0);
-    }
+    for (const Point& p : inside) EXPECT_TRUE(p.x >= 0 && p.y >= 0);
     // a turned square within the frame keeps its area; one outside has none
     const std::vector<Point> diamond = {{50, 10}, {60, 20}, {50, 30}, {40, 20}};
     EXPECT_NEAR(polygonArea(clipToFrame(diamond, 100, 50)), 200, 1e-3);

@@ -15,10 +15,8 @@ TEST(HandVariation, SettingsReadBackWhatIsDescribed) {
     std::string error;
     for (const char* s : {"rotation=-40,25", "noise=3", "leftShare=0.25", "backgrounds=stripes,checker:2.5", "skinTone=0.5,1"})
         ASSERT_TRUE(setVariation(changed, s, error)) << s << ": " << error;
-    EXPECT_EQ(changed.rotation.low, -40);
-    EXPECT_EQ(changed.rotation.high, 25);
-    EXPECT_EQ(changed.noise.low, 3);
-    EXPECT_EQ(changed.noise.high, 3);
+    EXPECT_TRUE(changed.rotation.low == -40 && changed.rotation.high == 25);
+    EXPECT_TRUE(changed.noise.low == 3 && changed.noise.high == 3);
     const std::array<float, kBackgroundKindCount> stripesAndChecker{0, 0, 0, 1, 2.5f, 0};
     EXPECT_EQ(changed.backgrounds, stripesAndChecker);
 
@@ -66,20 +64,13 @@ TEST(HandVariation, RandomDrawsHaveTheirShapes) {
     double sum = 0, sum2 = 0, nsum = 0, nsum2 = 0, fsum = 0, fsum2 = 0;
     std::vector<int> bins(7, 0);
     for (int i = 0; i < n; ++i) {
-        const double u = random.uniform();
-        ASSERT_GE(u, 0);
-        ASSERT_LT(u, 1);
-        sum += u;
-        sum2 += u * u;
-        const double z = random.normal();
-        nsum += z;
-        nsum2 += z * z;
-        const double f = random.fastNormal();
-        fsum += f;
-        fsum2 += f * f;
+        const double u = random.uniform(), z = random.normal(), f = random.fastNormal();
+        ASSERT_TRUE(u >= 0 && u < 1) << u;
+        sum += u, sum2 += u * u;
+        nsum += z, nsum2 += z * z;
+        fsum += f, fsum2 += f * f;
         const int k = random.below(7);
-        ASSERT_GE(k, 0);
-        ASSERT_LT(k, 7);
+        ASSERT_TRUE(k >= 0 && k < 7) << k;
         ++bins[k];
     }
     EXPECT_NEAR(sum / n, 0.5, 0.005);

@@ -108,14 +108,9 @@ TEST(ArchiveLayout, memoryImagesWithoutGapsOrLengths) {
 }
 
 TEST(ArchiveLiteral, marksAreVerifiedAndRefusedWithTheirText) {
-    std::istringstream good("\nVersion");
-    ArchiveI archive(good);
-    EXPECT_NO_THROW(archive & "\n" & "Version");
-
     struct Case {
         std::string input;
-        const char* mark;
-        const char* tail;
+        const char *mark, *tail;
     };
     const Case cases[] = {
         {"x", "\n", "cannot read \"\n\" from \"x"},
@@ -129,7 +124,6 @@ TEST(ArchiveLiteral, marksAreVerifiedAndRefusedWithTheirText) {
             ArchiveI in(stream);
             in & c.mark;
         });
-        EXPECT_TRUE(check.thrown);
         EXPECT_EQ(check.expression, LITERAL_EXPRESSION);
         EXPECT_EQ(check.tail, c.tail);
         EXPECT_EQ(check.function, "operator&");
@@ -152,18 +146,14 @@ TEST(ArchiveLiteral, marksAreVerifiedAndRefusedWithTheirText) {
         stream.setstate(std::ios::failbit);
         ArchiveI archive(stream);
     });
-    EXPECT_TRUE(failedStream.thrown);
     EXPECT_EQ(failedStream.expression, "stream_");
     EXPECT_EQ(failedStream.tail, "empty stream");
 }
 
 TEST(ArchiveString, lengthLimitEmptyStringAndNulInside) {
-    for (const size_t length : {998u, 999u}) {
-        const std::string text(length, 'q');
-        EXPECT_EQ(readBack<std::string>(bytesOf(text)), text);
-    }
+    const std::string longest(999, 'q');
+    EXPECT_EQ(readBack<std::string>(bytesOf(longest)), longest);
     const FailedCheck check = catchCheck([] { readBack<std::string>(bytesOf(std::string(1000, 'q'))); });
-    EXPECT_TRUE(check.thrown);
     EXPECT_EQ(check.expression, "buffer[MAX_BUFFER_SIZE - 1] == 0");
     EXPECT_EQ(check.tail, "too large string");
 
@@ -252,7 +242,6 @@ TEST(ArchiveFile, loadReadsAnObjectAndRefusesAMissingFile) {
 
     const std::string missing = ::testing::TempDir() + "tactus_no_such_dir/none.nn";
     const FailedCheck check = catchCheck([&] { ArchiveI::load(missing, record); });
-    EXPECT_TRUE(check.thrown);
     EXPECT_EQ(check.expression, "file");
     EXPECT_EQ(check.tail, "cannot open " + missing);
 }
@@ -264,32 +253,25 @@ TEST(ArchiveImage, roundTripWritesRowsWithoutPadding) {
     const std::string bytes = bytesOf(color);
     EXPECT_EQ(bytes.size(), 8u + 4u + 5 * 3 * 3);
     EXPECT_EQ(bytes.substr(0, 12), bytesOf(Size(5, 3)) + bytesOf(COLOR_MODE_BGR));
-    const Image colorBack = readBack<Image>(bytes);
-    EXPECT_TRUE(colorBack == color);
+    EXPECT_TRUE(readBack<Image>(bytes) == color);
 
-    // a reference into a wider image: its rows are 10 bytes apart, only 4 of each are its own
+    // a reference into a wider image: its rows are 10 bytes apart, only 4 of each are its own;
+    // reading replaces whatever the target held
     Image big(Size(10, 6), COLOR_MODE_MONO);
+    std::string expectedPixels;
     for (int y = 0; y < 6; ++y)
         for (int x = 0; x < 10; ++x) big.row(y)[x] = static_cast<unsigned char>(10 * y + x);
-    Image part;
-    part.createRef(big, Rect(2, 1, 6, 4));
-    ASSERT_EQ(part.stripLength(), 10u);
-    const std::string partBytes = bytesOf(part);
-    ASSERT_EQ(partBytes.size(), 12u + 4 * 3);
-    std::string expectedPixels;
     for (int y = 1; y < 4; ++y)
         for (int x = 2; x < 6; ++x) expectedPixels += static_cast<char>(10 * y + x);
-    EXPECT_EQ(partBytes.substr(12), expectedPixels);
-
-    // reading replaces whatever the target held
+    Image part;
+    part.createRef(big, Rect(2, 1, 6, 4));
+    const std::string partBytes = bytesOf(part);
+    EXPECT_EQ(partBytes, bytesOf(Size(4, 3)) + bytesOf(COLOR_MODE_MONO) + expectedPixels);
     std::istringstream stream(partBytes);
     ArchiveI in(stream);
     Image target(Size(2, 2), COLOR_MODE_FLOAT);
     in & target;
-    EXPECT_EQ(target.size(), Size(4, 3));
-    EXPECT_EQ(target.colorMode(), COLOR_MODE_MONO);
     EXPECT_TRUE(target == part);
-
 }
 
 TEST(SizeParse, readsItsPrintFormAndNamesTheBadPiece) {
@@ -301,19 +283,13 @@ TEST(SizeParse, readsItsPrintFormAndNamesTheBadPiece) {
     EXPECT_EQ(second, Size(0, 7));
 
     struct Case {
-        const char* text;
-        const char* expression;
-        const char* tail;
+        const char *text, *mark, *tail;
     };
     const Case cases[] = {
-        {"Size[1, 2)", "(std::string(\"Size(\") == buffer) && (std::istream&)(stream)",
-         "cannot parse `Size(` from `Size[`"},
-        {"Size(1; 2)", "(std::string(\", \") == buffer) && (std::istream&)(stream)",
-         "cannot parse `, ` from `; `"},
-        {"Size(a, 2)", "(std::string(\", \") == buffer) && (std::istream&)(stream)",  // failed number
-         "cannot parse `, ` from ``"},
-        {"Size(1, 2", "(std::string(\")\") == buffer) && (std::istream&)(stream)",
-         "cannot parse `)` from ``"},
+        {"Size[1, 2)", "Size(", "cannot parse `Size(` from `Size[`"},
+        {"Size(1; 2)", ", ", "cannot parse `, ` from `; `"},
+        {"Size(a, 2)", ", ", "cannot parse `, ` from ``"},  // a failed number
+        {"Size(1, 2", ")", "cannot parse `)` from ``"},
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.text);
@@ -322,8 +298,8 @@ TEST(SizeParse, readsItsPrintFormAndNamesTheBadPiece) {
             Size size;
             stream >> size;
         });
-        EXPECT_TRUE(check.thrown);
-        EXPECT_EQ(check.expression, c.expression);
+        EXPECT_EQ(check.expression,
+                  "(std::string(\"" + std::string(c.mark) + "\") == buffer) && (std::istream&)(stream)");
         EXPECT_EQ(check.tail, c.tail);
     }
 

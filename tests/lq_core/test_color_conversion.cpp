@@ -3,6 +3,7 @@
 #include <cstring>
 #include <functional>
 #include <random>
+#include <tuple>
 
 #include "LQ_ColorSpaceConversion.h"
 #include "LQ_Depth.h"
@@ -164,17 +165,17 @@ TEST(ColorConversion, CameraFormats) {
 }
 
 TEST(ColorConversion, DepthRamp) {
+    // t = (depth - 500) * 765 / 4500 in three segments; the middle and last wrap their bytes
+    const int ramp[][4] = {{500, 0, 0, 0},
+                           {5000, 0, 0, 0},
+                           {600, 255, 17, 0},
+                           {2500, static_cast<unsigned char>(254 - 340), 255, static_cast<unsigned char>(342)},
+                           {4000, static_cast<unsigned char>(598), static_cast<unsigned char>(252 - 595), 255}};
     unsigned char r, g, b;
-    LQ::pixelToRGB(500, r, g, b, 500, 5000);
-    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{0, 0, 0}));
-    LQ::pixelToRGB(5000, r, g, b, 500, 5000);
-    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{0, 0, 0}));
-    LQ::pixelToRGB(600, r, g, b, 500, 5000);  // t = 100 * 765 / 4500 = 17
-    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{255, 17, 0}));
-    LQ::pixelToRGB(2500, r, g, b, 500, 5000);  // t = 340: the middle segment
-    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{static_cast<unsigned char>(254 - 340), 255, static_cast<unsigned char>(342)}));
-    LQ::pixelToRGB(4000, r, g, b, 500, 5000);  // t = 595
-    EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{static_cast<unsigned char>(598), static_cast<unsigned char>(252 - 595), 255}));
+    for (const auto& d : ramp) {
+        LQ::pixelToRGB(d[0], r, g, b, 500, 5000);
+        EXPECT_EQ((std::vector<int>{r, g, b}), (std::vector<int>{d[1], d[2], d[3]})) << d[0];
+    }
     FailedCheck check = catchCheck([&] { LQ::pixelToRGB(1, r, g, b, 7, 7); });
     EXPECT_EQ(check.expression, "(maxDepth) > (minDepth)");
     EXPECT_EQ(check.tail, "7 <= 7");
@@ -193,43 +194,48 @@ TEST(ColorConversion, DepthRamp) {
 namespace {
 using Bytes = std::vector<unsigned char>;
 
-// Row buffers of exactly the size a kernel may touch, so that a read or write past them
-// shows under the sanitizer.
-struct Nv21Row {
-    Bytes luma, pairs;
-    Nv21Row(int width, int zoom, std::mt19937& random)
-        : luma(randomBytes(zoom * width, random)), pairs(randomBytes((zoom * width + 1) & ~1, random)) {}
-};
+// Random rows in exact-size buffers, so that an access past a row shows under the sanitizer:
+// plain (kind 0), 0 and 255 only (kind 1: the saturating sums) or near-flat (kind 2).
+Bytes testRow(size_t count, std::mt19937& random, int kind) {
+    Bytes row = randomBytes(count, random);
+    for (auto& b : row) b = static_cast<unsigned char>(kind == 1 ? (b & 1 ? 255 : 0) : kind == 2 ? 100 + b % 4 : b);
+    return row;
+}
+
+// the NV21 rows of one target row: zoom * width bytes of luma and as many of V, U pairs
+template <class Row>
+void compareNv21(Row vectorRow, int width, std::mt19937& random) {
+    for (int zoom : {1, 2}) {
+        const Bytes luma = randomBytes(zoom * width, random), pairs = randomBytes((zoom * width + 1) & ~1, random);
+        for (bool flip : {false, true}) {
+            Bytes scalar(3 * width, 1), vector(3 * width, 2);
+            LQ::nv21RowScalar(luma.data(), pairs.data(), scalar.data(), width, zoom, flip);
+            vectorRow(luma.data(), pairs.data(), vector.data(), width, zoom, flip);
+            EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
+        }
+    }
+}
 }  // namespace
 
 #if defined(LQ_HAVE_NEON)
 TEST(ColorConversion, NeonRowsEqualScalarRows) {
     std::mt19937 random(21);
-    for (int width = 1; width <= 67; ++width) {
-        for (int step : {3, 4}) {
-            const Bytes in = randomBytes(step * width, random);
-            for (int r : {0, 2}) {
-                Bytes scalar(width, 1), vector(width, 2);
-                LQ::lumaRowScalar(in.data(), scalar.data(), width, step, r, 1, 2 - r);
-                LQ::lumaRowNeon(in.data(), vector.data(), width, step, r);
-                EXPECT_EQ(scalar, vector) << "luma, width " << width << " step " << step << " red at " << r;
-            }
-        }
+    for (int width = 1; width <= 99; ++width) {
+        for (int kind = 0; kind < 3; ++kind)
+            for (int step : {3, 4})
+                for (int r : {0, 2}) {
+                    const Bytes in = testRow(step * width, random, kind);
+                    Bytes scalar(width, 1), vector(width, 2);
+                    LQ::lumaRowScalar(in.data(), scalar.data(), width, step, r, 1, 2 - r);
+                    LQ::lumaRowNeon(in.data(), vector.data(), width, step, r);
+                    EXPECT_EQ(scalar, vector) << "luma, width " << width << " step " << step << " red at " << r;
+                }
         const Bytes yuv = randomBytes(3 * width, random);
         Bytes scalar(width, 1), vector(width, 2);
         LQ::yuvToMonoRowScalar(yuv.data(), scalar.data(), width);
         LQ::yuvToMonoRowNeon(yuv.data(), vector.data(), width);
         EXPECT_EQ(scalar, vector) << "YUV to mono, width " << width;
-
-        for (int zoom : {1, 2}) {
-            const Nv21Row row(width, zoom, random);
-            for (bool flip : {false, true}) {
-                Bytes scalar(3 * width, 1), vector(3 * width, 2);
-                LQ::nv21RowScalar(row.luma.data(), row.pairs.data(), scalar.data(), width, zoom, flip);
-                LQ::nv21RowNeon(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
-                EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
-            }
-        }
+        compareNv21(LQ::nv21RowNeon, width, random);
     }
 }
 #endif
@@ -238,87 +244,60 @@ TEST(ColorConversion, NeonRowsEqualScalarRows) {
 TEST(ColorConversion, HostVectorRowsEqualScalarRows) {
     if (!__builtin_cpu_supports("ssse3")) GTEST_SKIP() << "this processor has no SSSE3";
     const bool avx2 = __builtin_cpu_supports("avx2");
+    using Row = void (*)(const unsigned char*, unsigned char*, int, int);
+    using Move = void (*)(const unsigned char*, unsigned char*, int);
     std::mt19937 random(22);
-    for (int width = 1; width <= 67; ++width) {
-        const Bytes in = randomBytes(3 * width, random);
-        for (int r : {0, 2}) {
-            Bytes scalar(width, 1), vector(width, 2);
-            LQ::lumaRowScalar(in.data(), scalar.data(), width, 3, r, 1, 2 - r);
-            LQ::lumaRowSse(in.data(), vector.data(), width, r);
-            EXPECT_EQ(scalar, vector) << "luma, width " << width << " red at " << r;
-            if (avx2) {
-                LQ::lumaRowAvx2(in.data(), vector.data(), width, r);
-                EXPECT_EQ(scalar, vector) << "luma AVX2, width " << width << " red at " << r;
+    for (int width = 1; width <= 99; ++width)
+        for (int kind = 0; kind < 3; ++kind) {
+            const Bytes in = testRow(3 * width, random, kind), rgba = testRow(4 * width, random, kind);
+            for (int r : {0, 2}) {
+                Bytes luma(width), luma4(width), yuv(3 * width), rgb(3 * width), four;
+                LQ::lumaRowScalar(in.data(), luma.data(), width, 3, r, 1, 2 - r);
+                LQ::lumaRowScalar(rgba.data(), luma4.data(), width, 4, r, 1, 2 - r);
+                LQ::rgbToYuvRowScalar(in.data(), yuv.data(), width, 3, r);
+                LQ::yuvToRgbRowScalar(in.data(), rgb.data(), width, 3, r);
+                for (int x = 0; x < width; ++x) four.insert(four.end(), {in[3 * x + r], in[3 * x + 1], in[3 * x + 2 - r], 255});
+                const std::tuple<const char*, const Bytes&, const Bytes&, std::vector<Row>> cases[] = {
+                    {"luma", in, luma, {LQ::lumaRowSse, avx2 ? LQ::lumaRowAvx2 : nullptr}},
+                    {"four-byte luma", rgba, luma4, {avx2 ? LQ::lumaRow4Avx2 : nullptr}},
+                    {"to YUV", in, yuv, {LQ::rgbToYuvRowSse, avx2 ? LQ::rgbToYuvRowAvx2 : nullptr}},
+                    {"from YUV", in, rgb, {LQ::yuvToRgbRowSse, avx2 ? LQ::yuvToRgbRowAvx2 : nullptr}},
+                    {"to four bytes", in, four, {LQ::toFourRowSse}},
+                };
+                for (const auto& [what, source, expected, rows] : cases)
+                    for (Row row : rows) {
+                        if (!row) continue;
+                        Bytes actual(expected.size(), 2);
+                        row(source.data(), actual.data(), width, r);
+                        ASSERT_EQ(actual, expected) << what << ", width " << width << " red at " << r << " kind " << kind;
+                    }
             }
-            Bytes scalar3(3 * width, 1), vector3(3 * width, 2);
-            LQ::rgbToYuvRowScalar(in.data(), scalar3.data(), width, 3, r);
-            LQ::rgbToYuvRowSse(in.data(), vector3.data(), width, r);
-            EXPECT_EQ(scalar3, vector3) << "to YUV, width " << width << " red at " << r;
-            if (avx2) {
-                LQ::rgbToYuvRowAvx2(in.data(), vector3.data(), width, r);
-                EXPECT_EQ(scalar3, vector3) << "to YUV AVX2, width " << width << " red at " << r;
-                const Bytes rgba = randomBytes(4 * width, random);
-                LQ::lumaRowScalar(rgba.data(), scalar.data(), width, 4, r, 1, 2 - r);
-                LQ::lumaRow4Avx2(rgba.data(), vector.data(), width, r);
-                EXPECT_EQ(scalar, vector) << "four-byte luma AVX2, width " << width << " red at " << r;
+            // the byte moves: byte 0 of each pixel, spread to three, and bytes 0 and 2 exchanged
+            Bytes first(width), spread(3 * width), swapped(in);
+            for (int x = 0; x < width; ++x) {
+                first[x] = in[3 * x];
+                spread[3 * x] = spread[3 * x + 1] = spread[3 * x + 2] = in[3 * x];
+                std::swap(swapped[3 * x], swapped[3 * x + 2]);
             }
-            Bytes four(4 * width);
-            LQ::toFourRowSse(in.data(), four.data(), width, r);
-            for (int x = 0; x < width; ++x)
-                ASSERT_EQ((Bytes{four.begin() + 4 * x, four.begin() + 4 * x + 4}),
-                          (Bytes{in[3 * x + r], in[3 * x + 1], in[3 * x + 2 - r], 255}))
-                    << "to four bytes, width " << width << " at " << x;
-            LQ::yuvToRgbRowScalar(in.data(), scalar3.data(), width, 3, r);
-            LQ::yuvToRgbRowSse(in.data(), vector3.data(), width, r);
-            EXPECT_EQ(scalar3, vector3) << "from YUV, width " << width << " red at " << r;
-            if (avx2) {
-                LQ::yuvToRgbRowAvx2(in.data(), vector3.data(), width, r);
-                EXPECT_EQ(scalar3, vector3) << "from YUV AVX2, width " << width << " red at " << r;
-            }
+            Bytes actual(width);
+            LQ::channelRowSse(in.data(), actual.data(), width, 0);
+            ASSERT_EQ(actual, first) << width;
+            const std::tuple<const Bytes&, const Bytes&, std::vector<Move>> moves[] = {
+                {first, spread, {LQ::spreadRowSse, avx2 ? LQ::spreadRowAvx2 : nullptr}},
+                {in, swapped, {LQ::swapRowSse, avx2 ? LQ::swapRowAvx2 : nullptr}},
+            };
+            for (const auto& [source, expected, rows] : moves)
+                for (Move row : rows)
+                    // the AVX2 rows store aligned after a lead-in: try other starts of the target
+                    for (int at : {0, 1, 7, 16, 29}) {
+                        if (!row) continue;
+                        Bytes shifted(expected.size() + 32, 3);
+                        row(source.data(), shifted.data() + at, width);
+                        ASSERT_EQ(expected, Bytes(shifted.begin() + at, shifted.begin() + at + expected.size())) << width << " at " << at;
+                    }
+            compareNv21(LQ::nv21RowSse, width, random);
+            if (avx2) compareNv21(LQ::nv21RowAvx2, width, random);
         }
-        Bytes first(width), spread(3 * width), swapped(3 * width);
-        LQ::channelRowSse(in.data(), first.data(), width, 0);
-        LQ::spreadRowSse(first.data(), spread.data(), width);
-        if (avx2) {
-            Bytes wide(3 * width);
-            LQ::spreadRowAvx2(first.data(), wide.data(), width);
-            EXPECT_EQ(spread, wide) << "spread AVX2, width " << width;
-        }
-        LQ::swapRowSse(in.data(), swapped.data(), width);
-        if (avx2) {
-            Bytes wide(3 * width);
-            LQ::swapRowAvx2(in.data(), wide.data(), width);
-            EXPECT_EQ(swapped, wide) << "swap AVX2, width " << width;
-            // the row starts with pixels up to where the stores are aligned: try other starts
-            Bytes shifted(3 * width + 32);
-            for (int at : {1, 7, 16, 29}) {
-                LQ::swapRowAvx2(in.data(), shifted.data() + at, width);
-                EXPECT_EQ(swapped, Bytes(shifted.begin() + at, shifted.begin() + at + 3 * width)) << width << " at " << at;
-            }
-        }
-        for (int x = 0; x < width; ++x) {
-            ASSERT_EQ(first[x], in[3 * x]) << width;
-            ASSERT_EQ(spread[3 * x + 1], in[3 * x]) << width;
-            ASSERT_EQ(spread[3 * x + 2], in[3 * x]) << width;
-            ASSERT_EQ(swapped[3 * x], in[3 * x + 2]) << width;
-            ASSERT_EQ(swapped[3 * x + 1], in[3 * x + 1]) << width;
-            ASSERT_EQ(swapped[3 * x + 2], in[3 * x]) << width;
-        }
-
-        for (int zoom : {1, 2}) {
-            const Nv21Row row(width, zoom, random);
-            for (bool flip : {false, true}) {
-                Bytes scalar(3 * width, 1), vector(3 * width, 2);
-                LQ::nv21RowScalar(row.luma.data(), row.pairs.data(), scalar.data(), width, zoom, flip);
-                LQ::nv21RowSse(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
-                EXPECT_EQ(scalar, vector) << "NV21, width " << width << " zoom " << zoom << " flip " << flip;
-                if (avx2) {
-                    LQ::nv21RowAvx2(row.luma.data(), row.pairs.data(), vector.data(), width, zoom, flip);
-                    EXPECT_EQ(scalar, vector) << "NV21 AVX2, width " << width << " zoom " << zoom << " flip " << flip;
-                }
-            }
-        }
-    }
 }
 #endif
 
@@ -332,6 +311,9 @@ TEST(ColorConversion, EverySizeStrideAndRectangle) {
         {LQ::COLOR_MODE_RGB, LQ::rgbToRgba},  {LQ::COLOR_MODE_RGBA, LQ::rgbaToBgr},
         {LQ::COLOR_MODE_MONO, LQ::monoToBgr}, {LQ::COLOR_MODE_MONO, LQ::monoToRgba},
         {LQ::COLOR_MODE_YUV, LQ::yuvToBgr},   {LQ::COLOR_MODE_YUV, LQ::yuvToRgba},
+        {LQ::COLOR_MODE_RGB, LQ::rgbToMono},  {LQ::COLOR_MODE_BGR, LQ::bgrToRgba},
+        {LQ::COLOR_MODE_RGB, LQ::rgbToBgr},   {LQ::COLOR_MODE_MONO, LQ::monoToRgb},
+        {LQ::COLOR_MODE_YUV, LQ::yuvToRgb},
         {LQ::COLOR_MODE_MONO16, [](const Image& s, Image& t, const Rect& r) { LQ::mono16ToRgb(s, t, 0.5f, r); }},
         {LQ::COLOR_MODE_DEPTH, [](const Image& s, Image& t, const Rect& r) { LQ::depthToRgb(s, t, 10, 60000, r); }},
     };

@@ -1,8 +1,6 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <cstdint>
-#include <cstring>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -18,6 +16,14 @@ using namespace LQ;
 namespace {
 const float PI = 3.14159265f;
 const float EPS = 1e-5f;
+
+using P3 = Point3dF;
+
+void expectCheck(const FailedCheck& check, const std::string& expression, const std::string& tail) {
+    EXPECT_TRUE(check.thrown) << expression;
+    EXPECT_EQ(check.expression, expression);
+    EXPECT_EQ(check.tail, tail);
+}
 
 template <class T>
 std::string printed(const T& value) {
@@ -43,26 +49,16 @@ std::string printed(const T& value) {
 }  // namespace
 
 TEST(GeometryTypes, printForms) {
-    EXPECT_EQ(printed(Size(3, 4)), "Size(3, 4)");
     EXPECT_EQ(printed(Rect(1, -2, 3, 4)), "Rect(1, -2, 3, 4)");
-    EXPECT_EQ(printed(PointF(1.5f, -2.f)), "PointF(1.5, -2)");
     // a signed char is a number here, not a character
     EXPECT_EQ(printed(BasePoint<signed char>(-3, 65)), "PointC(-3, 65)");
     EXPECT_EQ(printed(Point3dF(1.f, 2.5f, -3.f)), "Point3dF(1, 2.5, -3)");
-    EXPECT_EQ(printed(RangeF(0.25f, 1.f)), "RangeF(0.25, 1)");
     // floats print with seven significant digits
     EXPECT_EQ(printed(PointF(1.f / 3.f, 0.1f)), "PointF(0.3333333, 0.1)");
     EXPECT_EQ(printed(RangeF(123456.7f, -2.f / 3.f)), "RangeF(123456.7, -0.6666667)");
 }
 
-TEST(GeometryTypes, rectScalingUsesStableMultiplier) {
-    std::uint32_t bits = 0;
-    const float multiplier = stableMultiplier<float>();
-    std::memcpy(&bits, &multiplier, sizeof(bits));
-    EXPECT_EQ(bits, 0x3F800008u);
-
-    EXPECT_EQ(Rect(0, 0, 10, 10) * 0.1f, Rect(0, 0, 1, 1));
-
+TEST(GeometryTypes, rectScalingAndShiftInBoundary) {
     // 90 * 1.3f falls just below 117: plain truncation would lose one
     EXPECT_LT(static_cast<int>(90 * 1.3f), 117);
     EXPECT_EQ(Rect(0, 0, 90, 180) * 1.3f, Rect(0, 0, 117, 234));
@@ -72,9 +68,7 @@ TEST(GeometryTypes, rectScalingUsesStableMultiplier) {
     EXPECT_EQ(Rect(0, 0, 5, 7) * 0.5f, Rect(0, 0, 2, 3));
     EXPECT_EQ(Rect(-5, -7, 0, 0) * 0.5f, Rect(-2, -3, 0, 0));
     EXPECT_EQ(Rect(1, 2, 5, 7) / 2.f, Rect(0, 1, 2, 3));
-}
 
-TEST(GeometryTypes, shiftInBoundary) {
     const Rect boundary(0, 0, 100, 50);
     EXPECT_EQ(Rect(10, 10, 20, 20).shiftInBoundary(boundary), Rect(10, 10, 20, 20));
     EXPECT_EQ(Rect(-5, 10, 15, 20).shiftInBoundary(boundary), Rect(0, 10, 20, 20));
@@ -84,14 +78,9 @@ TEST(GeometryTypes, shiftInBoundary) {
     EXPECT_EQ(Rect(0, 0, 5, 5).shiftInBoundary(Rect(10, 20, 30, 40)), Rect(10, 20, 15, 25));
     EXPECT_EQ(Rect(40, 50, 45, 55).shiftInBoundary(Rect(10, 20, 30, 40)), Rect(25, 35, 30, 40));
 
-    for (const Rect& tooLarge : {Rect(0, 0, 101, 10), Rect(0, 0, 10, 51)}) {
-        Rect rect = tooLarge;
-        const FailedCheck check = catchCheck([&] { rect.shiftInBoundary(boundary); });
-        EXPECT_TRUE(check.thrown);
-        EXPECT_EQ(check.expression,
-                  "width <= T(rectBoundary.size().width) && height <= T(rectBoundary.size().height)");
-        EXPECT_EQ(check.tail, "");
-    }
+    for (Rect tooLarge : {Rect(0, 0, 101, 10), Rect(0, 0, 10, 51)})
+        expectCheck(catchCheck([&] { tooLarge.shiftInBoundary(boundary); }),
+                    "width <= T(rectBoundary.size().width) && height <= T(rectBoundary.size().height)", "");
 }
 
 TEST(GeometryTypes, similarRectangles) {
@@ -99,30 +88,23 @@ TEST(GeometryTypes, similarRectangles) {
     EXPECT_TRUE(Similar(a, a, 1.2f, 0.5f));
     // zero widths: 0 < 0 fails
     EXPECT_FALSE(Similar(RectF(5.f, 0.f, 5.f, 10.f), RectF(5.f, 0.f, 5.f, 10.f), 1.2f, 0.5f));
-    EXPECT_FALSE(Similar(Rect(5, 0, 5, 10), Rect(5, 0, 5, 10), 1.2f, 0.5f));
     // heights are not compared
     EXPECT_TRUE(Similar(a, RectF(0.f, 4.f, 10.f, 6.f), 1.2f, 0.5f));
     // both comparisons are strict: widths 10 and 12, centre distance 5 with smaller width 10
     EXPECT_FALSE(Similar(a, RectF(-1.f, 0.f, 11.f, 10.f), 1.2f, 0.5f));
     EXPECT_TRUE(Similar(a, RectF(-1.f, 0.f, 11.f, 10.f), 1.25f, 0.5f));
     EXPECT_FALSE(Similar(a, RectF(5.f, 0.f, 15.f, 10.f), 1.2f, 0.5f));
-    EXPECT_FALSE(Similar(Rect(0, 0, 10, 10), Rect(3, 4, 13, 14), 1.2f, 0.5f));
     // integer centres are truncated halves: 5 and 6 here, where the float centres are 5.5 and 6
     EXPECT_TRUE(Similar(RectF(0.f, 0.f, 11.f, 10.f), RectF(0.f, 0.f, 12.f, 10.f), 1.2f, 0.05f));
     EXPECT_FALSE(Similar(Rect(0, 0, 11, 10), Rect(0, 0, 12, 10), 1.2f, 0.05f));
 
-    const auto expectCheck = [](const FailedCheck& check, const char* expression, const char* tail) {
-        EXPECT_TRUE(check.thrown);
-        EXPECT_EQ(check.expression, expression);
-        EXPECT_EQ(check.tail, tail);
-    };
     expectCheck(catchCheck([&] { Similar(a, a, 1.f, 0.5f); }), "widthSimilarity > 1.f",
                 "incorrect widthSimilarity = 1");
     expectCheck(catchCheck([&] { Similar(a, a, 1.2f, 1.5f); }), "positionSimilarity < 1.f",
                 "incorrect positionSimilarity = 1.5");
 }
 
-TEST(PlaneGeometry, projectionsAndIntersections) {
+TEST(PlaneGeometry, projectionsIntersectionsAndSegments) {
     EXPECT_POINT_NEAR(projectPointOnLine(PointF(3, 4), PointF(0, 0), PointF(2, 0)), 3.f, 0.f);
     EXPECT_POINT_NEAR(projectPointOnLine(PointF(3, 1), PointF(1, 1), PointF(5, 5)), 2.f, 2.f);
     // no direction: the line is its point
@@ -131,9 +113,7 @@ TEST(PlaneGeometry, projectionsAndIntersections) {
     PointF meet(-1, -1);
     EXPECT_TRUE(intersectLines(PointF(0, 0), PointF(2, 0), PointF(3, 5), PointF(0, -3), meet));
     EXPECT_POINT_NEAR(meet, 3.f, 0.f);
-    EXPECT_TRUE(intersectLines(PointF(1, 0), PointF(1, 1), PointF(0, 3), PointF(1, -1), meet));
-    EXPECT_POINT_NEAR(meet, 2.f, 1.f);
-    meet = PointF(-1, -1);
+    meet = PointF(-1, -1);  // left alone by the parallel cases below
     EXPECT_FALSE(intersectLines(PointF(0, 0), PointF(1, 1), PointF(0, 1), PointF(2, 2), meet));
     // a determinant of exactly 1e-5 still counts as parallel
     EXPECT_FALSE(intersectLines(PointF(0, 0), PointF(1, 0), PointF(0, 1), PointF(1, 1e-5f), meet));
@@ -144,19 +124,13 @@ TEST(PlaneGeometry, projectionsAndIntersections) {
 
     PointF centre;
     float radius = 0;
-    EXPECT_TRUE(makeCircleThrough3Points(PointF(1, 0), PointF(0, 1), PointF(-1, 0), centre, radius));
-    EXPECT_POINT_NEAR(centre, 0.f, 0.f);
-    EXPECT_NEAR(radius, 1.f, EPS);
     EXPECT_TRUE(makeCircleThrough3Points(PointF(4, 1), PointF(1, 4), PointF(-2, 1), centre, radius));
     EXPECT_POINT_NEAR(centre, 1.f, 1.f);
     EXPECT_NEAR(radius, 3.f, EPS);
     EXPECT_FALSE(makeCircleThrough3Points(PointF(0, 0), PointF(1, 1), PointF(2, 2), centre, radius));
     EXPECT_FALSE(makeCircleThrough3Points(PointF(0, 0), PointF(0, 0), PointF(2, 1), centre, radius));
-
     EXPECT_EQ(getOrthogonal(PointF(2, 3)), PointF(-3, 2));
-}
 
-TEST(PlaneGeometry, segments) {
     const PointF a(2, 0), b(6, 0);
     EXPECT_NEAR(getPositionPointOnSegment(PointF(5, 7), a, b), 0.75f, EPS);
     EXPECT_NEAR(getPositionPointOnSegment(PointF(0, 3), a, b), -0.5f, EPS);
@@ -164,7 +138,6 @@ TEST(PlaneGeometry, segments) {
 
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(5, 7), a, b), 5.f, 0.f);
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(0, 3), a, b), 2.f, 0.f);
-    EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(2, 2), PointF(0, 0), PointF(4, 4)), 2.f, 2.f);
     EXPECT_POINT_NEAR(getNearestPointOnSegment(PointF(9, 9), a, a), 2.f, 0.f);
 
     EXPECT_NEAR(getSignedDistanceToLine(PointF(0, 1), PointF(0, 0), PointF(1, 0)), -1.f, EPS);
@@ -172,13 +145,12 @@ TEST(PlaneGeometry, segments) {
     EXPECT_EQ(getSignedDistanceToLine(PointF(3, -2), PointF(1, 0), PointF(0, 0)), 0.f);
 }
 
-TEST(PlaneGeometry, anglesAndRotation) {
+TEST(PlaneGeometry, anglesRotationAndAreas) {
     EXPECT_NEAR(getAngle(PointF(1, 0), PointF(0, 1)), PI / 2, EPS);
     EXPECT_NEAR(getAngle(PointF(2, 0), PointF(-3, 0)), PI, EPS);
     EXPECT_NEAR(getAngle(PointF(3, 3), PointF(1, 0)), -PI / 4, EPS);
     EXPECT_EQ(getAngle(PointF(0, 0), PointF(1, 0)), 0.f);
 
-    EXPECT_POINT_NEAR(rotate(PointF(2, 0), PI / 2), 0.f, 2.f);
     EXPECT_POINT_NEAR(rotate(PointF(1, 0), -PI / 3), 0.5f, -std::sqrt(3.f) / 2);
 
     // 3·sin + 4·cos comes out just below 3 in float
@@ -190,9 +162,7 @@ TEST(PlaneGeometry, anglesAndRotation) {
     EXPECT_EQ(rotateRect(Rect(0, 0, 5, 3), PI / 2), Rect(0, -1, 3, 4));
     // the corners reach -2.07 and 12.07: truncated toward zero
     EXPECT_EQ(rotateRect(Rect(0, 0, 10, 10), PI / 4), Rect(-2, -2, 12, 12));
-}
 
-TEST(PlaneGeometry, areas) {
     const PointF triangle[3] = {{0, 0}, {4, 0}, {0, 3}};
     const PointF reversed[3] = {{0, 3}, {4, 0}, {0, 0}};
     EXPECT_NEAR(getTriangleArea(triangle), 6.f, EPS);
@@ -217,7 +187,6 @@ TEST(PlaneGeometry, shapeTests) {
         // 0.2 past the right edge: inside only within the tolerance
         EXPECT_TRUE(isPointInsideShape(PointF(4.2f, 2), shape, 0.5f));
         EXPECT_FALSE(isPointInsideShape(PointF(4.2f, 2), shape, 0.1f));
-        EXPECT_FALSE(isPointInsideShape(PointF(5, 2), shape, 0.5f));
         EXPECT_FALSE(isPointInsideShape(PointF(10, 10), shape, 5.f));
     }
     EXPECT_FALSE(isPointInsideShape(PointF(0, 0), {}, 1.f));
@@ -239,62 +208,51 @@ TEST(PlaneGeometry, shapeTests) {
     }
 }
 
-TEST(SpaceGeometry, projectionsAndAngles) {
-    EXPECT_POINT3D_NEAR(projectVectorOnPlane(Point3dF(1, 2, 3), Point3dF(0, 0, 5)), 1.f, 2.f, 0.f);
-    EXPECT_POINT3D_NEAR(projectVectorOnPlane(Point3dF(1, 0, 1), Point3dF(1, 1, 0)), 0.5f, -0.5f, 1.f);
-    EXPECT_POINT3D_NEAR(projectPointOnLine(Point3dF(1, 2, 3), Point3dF(0, 0, 0), Point3dF(0, 0, 2)), 0.f, 0.f,
-                        3.f);
-    EXPECT_POINT3D_NEAR(projectPointOnLine(Point3dF(1, 2, 3), Point3dF(5, 5, 5), Point3dF(0, 0, 0)), 5.f, 5.f,
-                        5.f);
-    EXPECT_POINT3D_NEAR(projectPointOnPlane(Point3dF(1, 2, 3), Point3dF(0, 0, 1), Point3dF(0, 0, 2)), 1.f,
-                        2.f, 1.f);
-    EXPECT_POINT3D_NEAR(projectPointOnPlane(Point3dF(3, 0, 0), Point3dF(1, 1, 0), Point3dF(-1, 0, 0)), 1.f,
-                        0.f, 0.f);
+TEST(SpaceGeometry, projectionsAnglesAndIntersections) {
+    EXPECT_POINT3D_NEAR(projectVectorOnPlane(P3(1, 2, 3), P3(0, 0, 5)), 1.f, 2.f, 0.f);
+    EXPECT_POINT3D_NEAR(projectVectorOnPlane(P3(1, 0, 1), P3(1, 1, 0)), 0.5f, -0.5f, 1.f);
+    EXPECT_POINT3D_NEAR(projectPointOnLine(P3(1, 2, 3), P3(0, 0, 0), P3(0, 0, 2)), 0.f, 0.f, 3.f);
+    EXPECT_POINT3D_NEAR(projectPointOnLine(P3(1, 2, 3), P3(5, 5, 5), P3(0, 0, 0)), 5.f, 5.f, 5.f);
+    EXPECT_POINT3D_NEAR(projectPointOnPlane(P3(1, 2, 3), P3(0, 0, 1), P3(0, 0, 2)), 1.f, 2.f, 1.f);
+    EXPECT_POINT3D_NEAR(projectPointOnPlane(P3(3, 0, 0), P3(1, 1, 0), P3(-1, 0, 0)), 1.f, 0.f, 0.f);
 
     const Point3dF up(0, 0, 1);
-    EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(0, 2, 0), up), PI / 2, EPS);
-    EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(0, 2, 0), -up), -PI / 2, EPS);
-    EXPECT_NEAR(getAngle(Point3dF(1, 0, 0), Point3dF(-1, 0, 0), up), PI, EPS);
+    EXPECT_NEAR(getAngle(P3(1, 0, 0), P3(0, 2, 0), up), PI / 2, EPS);
+    EXPECT_NEAR(getAngle(P3(1, 0, 0), P3(0, 2, 0), -up), -PI / 2, EPS);
+    EXPECT_NEAR(getAngle(P3(1, 0, 0), P3(-1, 0, 0), up), PI, EPS);
     // unit vectors whose dot product rounds past 1 must still give an angle
-    for (const Point3dF& v : {Point3dF(0.3f, 0.3f, 0.3f), Point3dF(1, 1, 1), Point3dF(0.2f, 0.3f, 0.4f)}) {
+    for (const Point3dF& v : {P3(0.3f, 0.3f, 0.3f), P3(1, 1, 1), P3(0.2f, 0.3f, 0.4f)}) {
         const float angle = getAngle(v, v * 2.f, up);
         EXPECT_FALSE(std::isnan(angle));
         EXPECT_NEAR(angle, 0.f, 1e-3f);
     }
 
-    EXPECT_NEAR(getAngleToPlane(Point3dF(1, 0, 1), Point3dF(0, 0, 3)), PI / 4, EPS);
-    EXPECT_NEAR(getAngleToPlane(Point3dF(1, 0, -1), Point3dF(0, 0, 3)), -PI / 4, EPS);
-    EXPECT_FALSE(std::isnan(getAngleToPlane(Point3dF(0.3f, 0.3f, 0.3f), Point3dF(0.6f, 0.6f, 0.6f))));
-}
+    EXPECT_NEAR(getAngleToPlane(P3(1, 0, 1), P3(0, 0, 3)), PI / 4, EPS);
+    EXPECT_NEAR(getAngleToPlane(P3(1, 0, -1), P3(0, 0, 3)), -PI / 4, EPS);
+    EXPECT_FALSE(std::isnan(getAngleToPlane(P3(0.3f, 0.3f, 0.3f), P3(0.6f, 0.6f, 0.6f))));
 
-TEST(SpaceGeometry, segmentsAndIntersections) {
     const Point3dF a(0, 0, 0), b(0, 0, 10);
-    EXPECT_NEAR(getPositionPointOnSegment(Point3dF(1, 1, 5), a, b), 0.5f, EPS);
-    EXPECT_NEAR(getPositionPointOnSegment(Point3dF(1, 1, -5), a, b), -0.5f, EPS);
-    EXPECT_EQ(getPositionPointOnSegment(Point3dF(1, 1, 5), b, b), 0.f);
-    EXPECT_POINT3D_NEAR(getNearestPointOnSegment(Point3dF(1, 1, 5), a, b), 0.f, 0.f, 5.f);
-    EXPECT_POINT3D_NEAR(getNearestPointOnSegment(Point3dF(1, 1, 15), a, b), 0.f, 0.f, 10.f);
+    EXPECT_NEAR(getPositionPointOnSegment(P3(1, 1, 5), a, b), 0.5f, EPS);
+    EXPECT_NEAR(getPositionPointOnSegment(P3(1, 1, -5), a, b), -0.5f, EPS);
+    EXPECT_EQ(getPositionPointOnSegment(P3(1, 1, 5), b, b), 0.f);
+    EXPECT_POINT3D_NEAR(getNearestPointOnSegment(P3(1, 1, 5), a, b), 0.f, 0.f, 5.f);
+    EXPECT_POINT3D_NEAR(getNearestPointOnSegment(P3(1, 1, 15), a, b), 0.f, 0.f, 10.f);
 
     Point3dF meet(-1, -1, -1);
-    EXPECT_TRUE(intersectLinePlane(Point3dF(0, 0, 10), Point3dF(0, 0, -2), Point3dF(5, 5, 1),
-                                   Point3dF(0, 0, 1), meet));
+    EXPECT_TRUE(intersectLinePlane(P3(0, 0, 10), P3(0, 0, -2), P3(5, 5, 1), P3(0, 0, 1), meet));
     EXPECT_POINT3D_NEAR(meet, 0.f, 0.f, 1.f);
-    EXPECT_TRUE(intersectLinePlane(Point3dF(0, 0, 0), Point3dF(1, 1, 1), Point3dF(0, 0, 3),
-                                   Point3dF(0, 0, -4), meet));
+    EXPECT_TRUE(intersectLinePlane(P3(0, 0, 0), P3(1, 1, 1), P3(0, 0, 3), P3(0, 0, -4), meet));
     EXPECT_POINT3D_NEAR(meet, 3.f, 3.f, 3.f);
-    meet = Point3dF(-1, -1, -1);
-    EXPECT_FALSE(
-        intersectLinePlane(Point3dF(0, 0, 0), Point3dF(1, 0, 0), Point3dF(0, 0, 3), Point3dF(0, 0, 1), meet));
-    EXPECT_FALSE(
-        intersectLinePlane(Point3dF(0, 0, 0), Point3dF(0, 0, 0), Point3dF(0, 0, 3), Point3dF(0, 0, 1), meet));
+    meet = P3(-1, -1, -1);
+    EXPECT_FALSE(intersectLinePlane(P3(0, 0, 0), P3(1, 0, 0), P3(0, 0, 3), P3(0, 0, 1), meet));
+    EXPECT_FALSE(intersectLinePlane(P3(0, 0, 0), P3(0, 0, 0), P3(0, 0, 3), P3(0, 0, 1), meet));
     EXPECT_POINT3D_NEAR(meet, -1.f, -1.f, -1.f);
 
     const Point3dF near(0, 0, 1), far(0, 0, 2);
-    EXPECT_EQ(selectNearestPointInDirection(near, far, Point3dF(0, 0, 1)), near);
-    EXPECT_EQ(selectNearestPointInDirection(near, far, Point3dF(0, 0, -1)), far);
+    EXPECT_EQ(selectNearestPointInDirection(near, far, P3(0, 0, 1)), near);
+    EXPECT_EQ(selectNearestPointInDirection(near, far, P3(0, 0, -1)), far);
     // a tie goes to the second
-    EXPECT_EQ(selectNearestPointInDirection(Point3dF(1, 0, 0), Point3dF(-1, 0, 0), Point3dF(0, 0, 1)),
-              Point3dF(-1, 0, 0));
+    EXPECT_EQ(selectNearestPointInDirection(P3(1, 0, 0), P3(-1, 0, 0), P3(0, 0, 1)), P3(-1, 0, 0));
 }
 
 // The history behind it lives for the whole process: this must be the only test that feeds it.
@@ -329,16 +287,14 @@ TEST(DeviceOrientation, angleFromAcceleration) {
 // Barycentric weights rebuild the point; transforms by matrix agree with the same
 // transform written out; the iterative pseudo-inverse of a tall matrix is a left inverse.
 TEST(PlaneGeometry, withMatrices) {
-    const LQ::BasePoint<float> triangle[3] = {{0, 0}, {4, 0}, {0, 2}};
+    const PointF triangle[3] = {{0, 0}, {4, 0}, {0, 2}};
     float w[4];
-    LQ::getBaryCoordsTriangle(LQ::BasePoint<float>(1, 0.5f), triangle, w);
-    EXPECT_NEAR(w[0], 0.5f, 1e-5f);
-    EXPECT_NEAR(w[1], 0.25f, 1e-5f);
-    EXPECT_NEAR(w[2], 0.25f, 1e-5f);
-    const LQ::BasePoint<float> square[4] = {{0, 0}, {2, 0}, {2, 2}, {0, 2}};
-    const LQ::BasePoint<float> p(0.5f, 1.5f);
-    LQ::getBaryCoordsQuad(p, square, w);
-    LQ::BasePoint<float> rebuilt(0, 0);
+    getBaryCoordsTriangle(PointF(1, 0.5f), triangle, w);
+    EXPECT_POINT3D_NEAR(P3(w[0], w[1], w[2]), 0.5f, 0.25f, 0.25f);
+    const PointF square[4] = {{0, 0}, {2, 0}, {2, 2}, {0, 2}};
+    const PointF p(0.5f, 1.5f);
+    getBaryCoordsQuad(p, square, w);
+    PointF rebuilt(0, 0);
     float sum = 0;
     for (int i = 0; i < 4; ++i) {
         rebuilt += square[i] * w[i];
@@ -349,28 +305,22 @@ TEST(PlaneGeometry, withMatrices) {
     EXPECT_NEAR(rebuilt.y, p.y, 1e-4f);
 
     const float h[9] = {2, 0, 3, 0, 1, -1, 0.5f, 0, 1};
-    const LQ::Matrix homography(LQ::Size(3, 3), h);
-    const LQ::BasePoint<float> q = LQ::applyHomography(LQ::BasePoint<float>(2, 4), homography);
-    EXPECT_FLOAT_EQ(q.x, 3.5f);  // (4 + 3) / 2
-    EXPECT_FLOAT_EQ(q.y, 1.5f);  // (4 - 1) / 2
-    // the same transform for coordinates twice as large maps 2p to 2q
-    const LQ::BasePoint<float> q2 =
-        LQ::applyHomography(LQ::BasePoint<float>(4, 8), LQ::scaleTransformArgument(2, homography));
-    EXPECT_FLOAT_EQ(q2.x, 7.f);
-    EXPECT_FLOAT_EQ(q2.y, 3.f);
+    const Matrix homography(Size(3, 3), h);
+    // ((4 + 3) / 2, (4 - 1) / 2); the same transform for coordinates twice as large maps 2p to 2q
+    EXPECT_POINT_NEAR(applyHomography(PointF(2, 4), homography), 3.5f, 1.5f);
+    EXPECT_POINT_NEAR(applyHomography(PointF(4, 8), scaleTransformArgument(2, homography)), 7.f, 3.f);
 
     const float a[6] = {0, -1, 10, 1, 0, 20};
-    const LQ::Matrix affine(LQ::Size(3, 2), a);
-    EXPECT_EQ(LQ::applyAffineTransformation(LQ::BasePoint<float>(1, 2), affine), LQ::BasePoint<float>(8, 21));
-    EXPECT_EQ(LQ::applyAffineTransformationToVec(LQ::BasePoint<float>(1, 2), affine), LQ::BasePoint<float>(-2, 1));
-    const FailedCheck wrong = catchCheck([&] { LQ::applyHomography(LQ::BasePoint<float>(), affine); });
-    EXPECT_EQ(wrong.expression, "matrix.size() == Size(3, 3)");
-    const FailedCheck empty = catchCheck([] { LQ::scaleTransformArgument(2, LQ::Matrix()); });
-    EXPECT_EQ(empty.expression, "!_transform.isEmpty()");
+    const Matrix affine(Size(3, 2), a);
+    EXPECT_EQ(applyAffineTransformation(PointF(1, 2), affine), PointF(8, 21));
+    EXPECT_EQ(applyAffineTransformationToVec(PointF(1, 2), affine), PointF(-2, 1));
+    EXPECT_EQ(catchCheck([&] { applyHomography(PointF(), affine); }).expression,
+              "matrix.size() == Size(3, 3)");
+    EXPECT_EQ(catchCheck([] { scaleTransformArgument(2, Matrix()); }).expression, "!_transform.isEmpty()");
 
     const float t[6] = {1, 2, 3, 4, 5, 7};
-    const LQ::Matrix tall(LQ::Size(2, 3), t);
-    const LQ::Matrix identity = LQ::pseudoInverseIterative(tall) * tall;
+    const Matrix tall(Size(2, 3), t);
+    const Matrix identity = pseudoInverseIterative(tall) * tall;
     for (int r = 0; r < 2; ++r)
         for (int c = 0; c < 2; ++c) EXPECT_NEAR(identity(r, c), r == c ? 1.f : 0.f, 1e-3f) << r << c;
 }

@@ -32,15 +32,8 @@ struct ScalarTrajectory {
 
 }  // namespace
 
-TEST(KalmanFilter, initSizesAndControl) {
-    const KalmanFilter f(DimentionParameters(4, 2, 1));
-    EXPECT_TRUE(f.A.isIdentity(4));
-    // width x height: B control x n, H n x m, K m x n
-    EXPECT_EQ(f.B.size(), Size(1, 4));
-    EXPECT_EQ(f.H.size(), Size(4, 2));
-    EXPECT_TRUE(KalmanFilter(DimentionParameters(4, 2, 0)).B.isEmpty());
-
-    // a control enters the prediction through B
+// a control enters the prediction through B; no control leaves the state as it is
+TEST(KalmanFilter, control) {
     KalmanFilter c(DimentionParameters(2, 1, 1));
     c.B(0, 0) = 0.5f;
     c.B(1, 0) = 1.f;

@@ -15,9 +15,7 @@ TEST(MathPeriodic, normalizeAndMix) {
     EXPECT_FLOAT_EQ(normalizePeriodic(360.f, 0.f, 360.f), 360.f);
     EXPECT_FLOAT_EQ(normalizePeriodic(0.f, 0.f, 360.f), 360.f);
     EXPECT_FLOAT_EQ(normalizePeriodic(725.f, -180.f, 180.f), 5.f);
-    const FailedCheck check = catchCheck([] { normalizePeriodic(1.f, 2.f, 2.f); });
-    EXPECT_TRUE(check.thrown);
-    EXPECT_EQ(check.expression, "a < b");
+    EXPECT_EQ(catchCheck([] { normalizePeriodic(1.f, 2.f, 2.f); }).expression, "a < b");
 
     EXPECT_EQ(mixPeriodic(0.5f, 350.f, 10.f, 360.f), 360.f);
     // the first value lifted: 370 + (350 - 370) / 4
@@ -141,20 +139,13 @@ TEST(Statistics, covarianceAndVariance) {
 }
 
 TEST(Statistics, regression) {
-    // a slope and an intercept, against the textbook simple regression in double
+    // a slope and an intercept worked out by hand: means 3.5 and 4, Sxx = 17.5, Sxy = 35,
+    // Syy = 70.12, so slope 2, intercept -3 and R^2 = 35^2 / (17.5 * 70.12)
     const int n = 6;
     const float x[2 * n] = {1, 2, 3, 4, 5, 6, 1, 1, 1, 1, 1, 1};
     float c[2] = {};
     const float y[n] = {-1.1f, 1.2f, 2.9f, 5.1f, 6.8f, 9.1f};
-    double mx = 0, my = 0;
-    for (int i = 0; i < n; ++i) mx += x[i] / double(n), my += y[i] / double(n);
-    double sxy = 0, sxx = 0, syy = 0;
-    for (int i = 0; i < n; ++i) {
-        sxy += (x[i] - mx) * (y[i] - my);
-        sxx += (x[i] - mx) * (x[i] - mx);
-        syy += (y[i] - my) * (y[i] - my);
-    }
-    const double slope = sxy / sxx, intercept = my - slope * mx, r2 = sxy * sxy / (sxx * syy);
+    const double slope = 2, intercept = -3, r2 = 1225 / 1227.1;
     EXPECT_NEAR(regression(x, y, c, n, 2), r2, 1e-5);
     EXPECT_NEAR(c[0], slope, 1e-4);
     EXPECT_NEAR(c[1], intercept, 1e-4);
@@ -170,7 +161,6 @@ TEST(Statistics, regression) {
     // the second regressor repeats the first: x x^T is singular
     const float twice[2 * 3] = {1, 2, 3, 2, 4, 6};
     const FailedCheck check = catchCheck([&] { regression(twice, y, c, 3, 2); });
-    EXPECT_TRUE(check.thrown);
     EXPECT_EQ(check.expression, "status");
     EXPECT_EQ(check.tail, "matrix inversion failed: Matrix(Size(2, 2)\n14\t28\t\n28\t56\t\n)\n");
 }

@@ -48,7 +48,6 @@ const char* const OTHER_TARGET = "destination and source matrices should be diff
 }  // namespace
 
 TEST(MatrixBasics, constructionCopiesAndConversions) {
-    EXPECT_TRUE(Matrix(Size(0, 0)).isEmpty());
     const Matrix m = make(3, 2, {1, 2, 3, 4, 5, 6});
     Matrix copy(m);
     copy[0] = 100;
@@ -154,11 +153,9 @@ TEST(MatrixInvert, pivotRulesTwoByTwoPathAndSingularInput) {
     const Matrix original(general);
     ASSERT_TRUE(Matrix::invert(general, general));
     expectNear(original * general, make(4, 4, {1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1}), 1e-5f);
-    expectCheck(
-        [] {
-            make(3, 2, {1, 2, 3, 4, 5, 6}).invert();
-        },
-        "inputMatrix.size().width == inputMatrix.size().height", "matrix is not square");
+    const Matrix wide = make(3, 2, {1, 2, 3, 4, 5, 6});
+    expectCheck([&] { wide.invert(); }, "inputMatrix.size().width == inputMatrix.size().height",
+                "matrix is not square");
 }
 
 TEST(MatrixArithmetic, productsAndDeterminants) {
@@ -189,11 +186,7 @@ TEST(MatrixArithmetic, productsAndDeterminants) {
     expectCheck([&] { Matrix::multiply(target, b, target); },
                 "&matrix1 != &matrixRes && &matrix2 != &matrixRes", OTHER_TARGET);
     expectCheck([&] { a + b; }, "matrix1.size() == matrix2.size()", "matrices of different sizes");
-    expectCheck(
-        [&] {
-            Matrix::XTXW(a, make(2, 3, {1, 1, 1, 1, 1, 1}), result);
-        },
-        "weight.size().width == 1", "is is not column");
+    expectCheck([&] { Matrix::XTXW(a, b, result); }, "weight.size().width == 1", "is is not column");
     expectCheck([] { Matrix(Size(4, 4)).determinant(); }, "0",
                 "Not implemented for sizes except 2x2 and 3x3");
 }

@@ -111,17 +111,24 @@ TEST(RmctTransform, BitDifferencesAndTheirChecks) {
 
 namespace {
 // Variant 0 is the scalar row, then NEON (SIMDe on x86), SSE2 and AVX2 where they exist.
-template <class F>
-std::vector<F> variants(F scalar, F neon, F sse, F avx2) {
-    std::vector<F> all{scalar};
 #if defined(LQ_HAVE_NEON)
-    all.push_back(neon);
+#define NEON_ROW(f) LQ::f##Neon
+#else
+#define NEON_ROW(f) nullptr
 #endif
 #if defined(LQ_HAVE_SSSE3)
-    all.push_back(sse);
-    if (avx2 && __builtin_cpu_supports("avx2")) all.push_back(avx2);
+#define SSE_ROW(f) LQ::f##Sse
+#define AVX2_ROW(f) (__builtin_cpu_supports("avx2") ? LQ::f##Avx2 : nullptr)
+#else
+#define SSE_ROW(f) nullptr
+#define AVX2_ROW(f) nullptr
 #endif
-    return all;
+template <class F>
+std::vector<F> variants(std::initializer_list<F> all) {
+    std::vector<F> present;
+    for (F f : all)
+        if (f) present.push_back(f);
+    return present;
 }
 
 // Random rows of every width in exact-size buffers, so that an access past a row shows under
@@ -143,38 +150,18 @@ void compareRows(const std::vector<F>& kernels, int minWidth, Run run) {
         }
 }
 
-#if !defined(LQ_HAVE_NEON)
-const std::nullptr_t rmctRowNeon = nullptr, integralRowNeon = nullptr, integralHogRowNeon = nullptr, sobelRowNeon = nullptr;
-#else
-using LQ::integralHogRowNeon;
-using LQ::integralRowNeon;
-using LQ::rmctRowNeon;
-using LQ::sobelRowNeon;
-#endif
-#if !defined(LQ_HAVE_SSSE3)
-const std::nullptr_t rmctRowSse = nullptr, rmctRowAvx2 = nullptr, integralRowSse = nullptr, integralRowAvx2 = nullptr,
-                     integralHogRowSse = nullptr, integralHogRowAvx2 = nullptr, sobelRowSse = nullptr;
-#else
-using LQ::integralHogRowAvx2;
-using LQ::integralHogRowSse;
-using LQ::integralRowAvx2;
-using LQ::integralRowSse;
-using LQ::rmctRowAvx2;
-using LQ::rmctRowSse;
-using LQ::sobelRowSse;
-#endif
 }  // namespace
 
 TEST(FeatureRows, VectorRowsEqualScalarRows) {
     using Census = decltype(&LQ::rmctRowScalar);
-    compareRows(variants<Census>(LQ::rmctRowScalar, rmctRowNeon, rmctRowSse, rmctRowAvx2), 3,
+    compareRows(variants<Census>({LQ::rmctRowScalar, NEON_ROW(rmctRow), SSE_ROW(rmctRow), AVX2_ROW(rmctRow)}), 3,
                 [](Census f, const std::vector<unsigned char>* rows, int width) {
                     std::vector<unsigned char> out(width, 77);  // the end columns stay untouched
                     f(rows[0].data(), rows[1].data(), rows[2].data(), out.data(), width);
                     return out;
                 });
     using Sobel = decltype(&LQ::sobelRowScalar);
-    compareRows(variants<Sobel>(LQ::sobelRowScalar, sobelRowNeon, sobelRowSse, nullptr), 3,
+    compareRows(variants<Sobel>({LQ::sobelRowScalar, NEON_ROW(sobelRow), SSE_ROW(sobelRow)}), 3,
                 [](Sobel f, const std::vector<unsigned char>* rows, int width) {
                     std::vector<signed char> out(2 * width, 55);
                     f(rows[0].data(), rows[1].data(), rows[2].data(), out.data(), width);
@@ -182,7 +169,7 @@ TEST(FeatureRows, VectorRowsEqualScalarRows) {
                 });
     // previous sums near the top of the range: wrapping must wrap alike
     using Integral = decltype(&LQ::integralRowScalar);
-    compareRows(variants<Integral>(LQ::integralRowScalar, integralRowNeon, integralRowSse, integralRowAvx2), 1,
+    compareRows(variants<Integral>({LQ::integralRowScalar, NEON_ROW(integralRow), SSE_ROW(integralRow), AVX2_ROW(integralRow)}), 1,
                 [](Integral f, const std::vector<unsigned char>* rows, int width) {
                     std::vector<unsigned int> above(width + 1, 0xFFFFF000u - width), out(width + 1, 5);
                     f(rows[0].data(), above.data(), out.data(), width);
@@ -190,7 +177,7 @@ TEST(FeatureRows, VectorRowsEqualScalarRows) {
                 });
     using Hog = decltype(&LQ::integralHogRowScalar);
     for (int bins : {6, 12})
-        compareRows(variants<Hog>(LQ::integralHogRowScalar, integralHogRowNeon, integralHogRowSse, integralHogRowAvx2), 3,
+        compareRows(variants<Hog>({LQ::integralHogRowScalar, NEON_ROW(integralHogRow), SSE_ROW(integralHogRow), AVX2_ROW(integralHogRow)}), 3,
                     [bins](Hog f, const std::vector<unsigned char>* rows, int width) {
                         const unsigned char* table = bins == 12 ? LQ::getHogSigned12() : LQ::getHogUnsigned6();
                         std::vector<unsigned int> previous((width + 1) * (bins + 1)), out(previous.size(), 7);

@@ -27,20 +27,6 @@ std::vector<unsigned char> pixelBytes(const LQ::Image& image, int x, int y) {
 
 using Bytes = std::vector<unsigned char>;
 
-// Random luma and chroma for one zoomed row, in exact-size buffers so that a read past
-// the row shows under the sanitizer, with the saturated corners of the colour space.
-struct RowPair {
-    std::vector<unsigned char> luma, chroma;
-    RowPair(int width, std::mt19937& random) : luma(2 * width), chroma(2 * width) {
-        for (auto& b : luma) b = static_cast<unsigned char>(random());
-        for (auto& b : chroma) b = static_cast<unsigned char>(random());
-        if (width > 3) {
-            luma[0] = 255, chroma[0] = 255, chroma[1] = 255;
-            luma[2] = 0, chroma[2] = 0, chroma[3] = 0;
-        }
-    }
-};
-
 }  // namespace
 
 TEST(Yuv420toBgr, HandComputedPixelsZoomedAndFull) {
@@ -86,30 +72,6 @@ TEST(Yuv420toBgr, OutputSizeAndTinyPictures) {
     EXPECT_TRUE(catchCheck([&] { LQ::yuv420toBgr(LQ::Image(), bgr, true, false); }).thrown);
 }
 
-#if defined(LQ_HAVE_NEON)
-TEST(Yuv420toBgr, VectorRowsEqualScalarRows) {
-    std::mt19937 random(7);
-    for (int width = 1; width <= 67; ++width) {
-        const RowPair row(width, random);
-        const std::vector<unsigned char>& luma = row.luma;
-        const std::vector<unsigned char>& chroma = row.chroma;
-        for (bool swap : {false, true}) {
-            std::vector<unsigned char> scalar(3 * width, 1), vector(3 * width, 2);
-            LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
-            LQ::yuvRowZoomNeon(luma.data(), chroma.data(), vector.data(), width, swap);
-            EXPECT_EQ(scalar, vector) << "zoom, width " << width;
-
-            if (width < 2) continue;  // a full-size row has at least one pair
-            std::vector<unsigned char> chromaRow(chroma.begin(), chroma.begin() + width);
-            std::vector<unsigned char> fullScalar(3 * width, 1), fullVector(3 * width, 2);
-            LQ::yuvRowFullScalar(luma.data(), chromaRow.data(), fullScalar.data(), width, swap);
-            LQ::yuvRowFullNeon(luma.data(), chromaRow.data(), fullVector.data(), width, swap);
-            EXPECT_EQ(fullScalar, fullVector) << "full, width " << width;
-        }
-    }
-}
-#endif
-
 TEST(Yuv420toBgr, WholeFramesOfOddSizesStayInsideTheirBuffers) {
     std::mt19937 random(11);
     for (int width = 2; width <= 35; width += 3) {
@@ -145,25 +107,37 @@ TEST(Yuv420toBgr, WholeFramesOfOddSizesStayInsideTheirBuffers) {
     }
 }
 
+// Random rows with the saturated corners of the colour space, in exact-size buffers so that
+// a read past the row shows under the sanitizer; a full-size row has at least one pair.
+TEST(Yuv420toBgr, VectorRowsEqualScalarRows) {
+    using Row = void (*)(const unsigned char*, const unsigned char*, unsigned char*, int, bool);
+    std::vector<std::pair<Row, Row>> rows;  // zoomed and full-size rows of each path (full: if any)
+#if defined(LQ_HAVE_NEON)
+    rows.push_back({LQ::yuvRowZoomNeon, LQ::yuvRowFullNeon});
+#endif
 #if defined(LQ_HAVE_SSSE3)
-TEST(Yuv420toBgr, HostVectorRowsEqualScalarRows) {
-    if (!LQ::haveSsse3()) GTEST_SKIP() << "this processor has no SSSE3";
-    std::mt19937 random(13);
+    if (LQ::haveSsse3()) rows.push_back({LQ::yuvRowZoomSse, nullptr});
+    if (LQ::haveAvx2()) rows.push_back({LQ::yuvRowZoomAvx2, nullptr});
+#endif
+    if (rows.empty()) GTEST_SKIP() << "no vector path on this machine";
+    std::mt19937 random(7);
     for (int width = 1; width <= 67; ++width) {
-        const RowPair row(width, random);
-        const std::vector<unsigned char>& luma = row.luma;
-        const std::vector<unsigned char>& chroma = row.chroma;
-        for (bool swap : {false, true}) {
-            std::vector<unsigned char> scalar(3 * width, 1), vector(3 * width, 2);
-            LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
-            LQ::yuvRowZoomSse(luma.data(), chroma.data(), vector.data(), width, swap);
-            EXPECT_EQ(scalar, vector) << "SSSE3, width " << width << " swap " << swap;
-            if (LQ::haveAvx2()) {
-                std::vector<unsigned char> wide(3 * width, 3);
-                LQ::yuvRowZoomAvx2(luma.data(), chroma.data(), wide.data(), width, swap);
-                EXPECT_EQ(scalar, wide) << "AVX2, width " << width << " swap " << swap;
+        Bytes luma(2 * width), chroma(2 * width);
+        for (auto& b : luma) b = static_cast<unsigned char>(random());
+        for (auto& b : chroma) b = static_cast<unsigned char>(random());
+        if (width > 3) luma[0] = chroma[0] = chroma[1] = 255, luma[2] = chroma[2] = chroma[3] = 0;
+        const Bytes chromaRow(chroma.begin(), chroma.begin() + width);
+        for (bool swap : {false, true})
+            for (size_t path = 0; path < rows.size(); ++path) {
+                Bytes scalar(3 * width, 1), vector(3 * width, 2);
+                LQ::yuvRowZoomScalar(luma.data(), chroma.data(), scalar.data(), width, swap);
+                rows[path].first(luma.data(), chroma.data(), vector.data(), width, swap);
+                EXPECT_EQ(scalar, vector) << "zoom, path " << path << " width " << width << " swap " << swap;
+                if (width < 2 || !rows[path].second) continue;
+                Bytes fullScalar(3 * width, 1), fullVector(3 * width, 2);
+                LQ::yuvRowFullScalar(luma.data(), chromaRow.data(), fullScalar.data(), width, swap);
+                rows[path].second(luma.data(), chromaRow.data(), fullVector.data(), width, swap);
+                EXPECT_EQ(fullScalar, fullVector) << "full, path " << path << " width " << width << " swap " << swap;
             }
-        }
     }
 }
-#endif

@@ -2,6 +2,7 @@
 
 #include <cstring>
 #include <sstream>
+#include <utility>
 
 #include "LQ_ColorModeData.h"
 #include "LQ_ImagePyramidData.h"
@@ -11,6 +12,7 @@
 #include "LQ_Integral.h"
 #include "LQ_Yuv420Converter.h"
 #include "LogCapture.h"
+#include "TestImages.h"
 
 using LQ::ColorMode;
 using LQ::Image;
@@ -20,12 +22,8 @@ using LQ::SharedPtr;
 using LQ::Size;
 
 namespace {
-Image pattern(int width, int height, ColorMode mode = LQ::COLOR_MODE_MONO, int seed = 0) {
-    Image image(Size(width, height), mode);
-    for (int y = 0; y < height; ++y)
-        for (int x = 0; x < width * image.depth(); ++x)
-            image.row(y)[x] = static_cast<unsigned char>((x * 7 + y * 13 + seed) * 2654435761u >> 24);
-    return image;
+Image pattern(int width, int height, ColorMode mode = LQ::COLOR_MODE_MONO, unsigned seed = 0) {
+    return randomImage(width, height, mode, seed);
 }
 
 // A node that records what it was asked to compute.
@@ -42,13 +40,6 @@ public:
     int computes = 0;
     Rect last;
 };
-
-bool samePixels(const Image& a, const Image& b) {
-    if (a.size() != b.size() || a.colorMode() != b.colorMode()) return false;
-    for (int y = 0; y < a.height(); ++y)
-        if (std::memcmp(a.row(y), b.row(y), static_cast<size_t>(a.width()) * a.depth())) return false;
-    return true;
-}
 
 SharedPtr<ImageData> root(const Image& image) {
     SharedPtr<ImageData> node(new ImageData(image.size(), image.colorMode()));
@@ -129,15 +120,15 @@ TEST(ImageData, DerivedNodesComputeTheirKernelsOverRectangles) {
     LQ::zoomImageTwice(gray, reference, Rect());
     EXPECT_TRUE(samePixels(half->get(), reference));
 
-    LQ::ImageZoomData::setResizeAlgorithm(LQ::ResizeAlgorithm::NEAREST_NEIGHBOUR);
-    SharedPtr<LQ::ImageZoomData> odd(new LQ::ImageZoomData(mono, 20));
-    EXPECT_EQ(odd->get().size(), Size(20, 15));
-    LQ::resizeImageNn(gray, reference, odd->zoom(), Rect());
-    EXPECT_TRUE(samePixels(odd->get(), reference));
-    LQ::ImageZoomData::setResizeAlgorithm(LQ::ResizeAlgorithm::BILINEAR);
-    SharedPtr<LQ::ImageZoomData> smooth(new LQ::ImageZoomData(mono, 20));
-    LQ::resizeImageBilinear(gray, reference, smooth->zoom(), Rect());
-    EXPECT_TRUE(samePixels(smooth->get(), reference));
+    // bilinear last: it is the default the other tests expect
+    for (bool nearest : {true, false}) {
+        LQ::ImageZoomData::setResizeAlgorithm(nearest ? LQ::ResizeAlgorithm::NEAREST_NEIGHBOUR
+                                                      : LQ::ResizeAlgorithm::BILINEAR);
+        SharedPtr<LQ::ImageZoomData> odd(new LQ::ImageZoomData(mono, 20));
+        EXPECT_EQ(odd->get().size(), Size(20, 15));
+        (nearest ? LQ::resizeImageNn : LQ::resizeImageBilinear)(gray, reference, odd->zoom(), Rect());
+        EXPECT_TRUE(samePixels(odd->get(), reference)) << nearest;
+    }
 
     // the same width is a reference, no copy
     SharedPtr<ImageData> same(new LQ::ImageZoomData(mono, 64));
@@ -159,12 +150,11 @@ TEST(ImageData, RotationFollowsTheAngleAndYuvNodesConvert) {
     angle = -540;  // normalised in place: 180
     EXPECT_EQ(turned->quarterTurns(), 2);
     EXPECT_EQ(angle, -180);
-    angle = 44;
-    EXPECT_EQ(turned->quarterTurns(), 0);
-    angle = 315;
-    EXPECT_EQ(turned->quarterTurns(), 0);
-    angle = 225;
-    EXPECT_EQ(turned->quarterTurns(), 3);
+    const std::pair<int, int> cases[] = {{44, 0}, {315, 0}, {225, 3}};
+    for (const auto& [a, turns] : cases) {
+        angle = a;
+        EXPECT_EQ(turned->quarterTurns(), turns) << a;
+    }
 
     // 4 x 2 luma rows and one row of V, U pairs
     Image yuv(Size(4, 3), LQ::COLOR_MODE_MONO);

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <sstream>
+#include <utility>
 
 #include "LQ_ObjectLocation.h"
 #include "LogCapture.h"
@@ -20,15 +21,12 @@ void expectNear(const PointF& a, const PointF& b) {
 }  // namespace
 
 TEST(AngleRange, NormalisesAndWrapsThroughHalfTurn) {
-    int angle = 315;
-    LQ::normalizeAngle(angle);
-    EXPECT_EQ(angle, -45);
-    angle = -181;
-    LQ::normalizeAngle(angle);
-    EXPECT_EQ(angle, 179);
-    angle = 180;
-    LQ::normalizeAngle(angle);
-    EXPECT_EQ(angle, -180);
+    const std::pair<int, int> cases[] = {{315, -45}, {-181, 179}, {180, -180}};
+    for (const auto& [in, out] : cases) {
+        int angle = in;
+        LQ::normalizeAngle(angle);
+        EXPECT_EQ(angle, out) << in;
+    }
 
     const AngleRange whole;
     EXPECT_TRUE(whole.contains(-180) && whole.contains(179));

@@ -57,25 +57,22 @@ TEST(CInterface, GetFunctionsReadTheCopyAndClearPastTheEnd) {
     ASSERT_NE(gesture, nullptr);  // an empty string, not null
     EXPECT_STREQ(gesture, "");
 
-    float l = 9, t = 9, r = 9, b = 9;
-    ASSERT_EQ(VI_Tactus_GetRect(l, t, r, b, 0), 1);
-    EXPECT_EQ(l, 1.5f);
-    EXPECT_EQ(t, 2.f);
-    EXPECT_EQ(r, 30.f);
-    EXPECT_EQ(b, 40.25f);
-    EXPECT_EQ(VI_Tactus_GetRect(l, t, r, b, 1), 0);
-    EXPECT_EQ(l + t + r + b, 0.f);
-
-    float x = 9, y = 9, z = 9, value = 9;
-    EXPECT_EQ(VI_Tactus_GetPoint(x, y, 0), 1);
-    EXPECT_EQ(x, 3.f);
-    EXPECT_EQ(y, 4.f);
-    EXPECT_EQ(VI_Tactus_GetPoint(x, y, 1), 0);
-    EXPECT_EQ(x + y, 0.f);
-    EXPECT_EQ(VI_Tactus_GetPoint3d(x, y, z, 0), 1);
-    EXPECT_EQ(z, 7.f);
-    EXPECT_EQ(VI_Tactus_GetPoint3d(x, y, z, 1), 0);
-    EXPECT_EQ(x + y + z, 0.f);
+    // past the end every output is zeroed
+    LQ::BaseRect<float> rect(9, 9, 9, 9);
+    ASSERT_EQ(VI_Tactus_GetRect(rect.left, rect.top, rect.right, rect.bottom, 0), 1);
+    EXPECT_EQ(rect, LQ::BaseRect<float>(1.5f, 2, 30, 40.25f));
+    EXPECT_EQ(VI_Tactus_GetRect(rect.left, rect.top, rect.right, rect.bottom, 1), 0);
+    EXPECT_EQ(rect, LQ::BaseRect<float>(0, 0, 0, 0));
+    LQ::BasePoint3d<float> p(9, 9, 9);
+    float value = 9;
+    EXPECT_EQ(VI_Tactus_GetPoint(p.x, p.y, 0), 1);
+    EXPECT_EQ(p, LQ::BasePoint3d<float>(3, 4, 9));
+    EXPECT_EQ(VI_Tactus_GetPoint(p.x, p.y, 1), 0);
+    EXPECT_EQ(p, LQ::BasePoint3d<float>(0, 0, 9));
+    EXPECT_EQ(VI_Tactus_GetPoint3d(p.x, p.y, p.z, 0), 1);
+    EXPECT_EQ(p, LQ::BasePoint3d<float>(5, 6, 7));
+    EXPECT_EQ(VI_Tactus_GetPoint3d(p.x, p.y, p.z, 1), 0);
+    EXPECT_EQ(p, LQ::BasePoint3d<float>(0, 0, 0));
     EXPECT_EQ(VI_Tactus_GetFloat(value, 0), 1);
     EXPECT_EQ(value, 12.5f);
     EXPECT_EQ(VI_Tactus_GetFloat(value, 1), 0);
@@ -178,27 +175,24 @@ TEST(CInterface, SetFrameChecksItsArguments) {
     EXPECT_EQ(check.expression, "(frame)");
     EXPECT_EQ(check.tail, " == NULL");
     EXPECT_EQ(check.function, "VI_Tactus_SetFrame");
-
     check = catchCheck([&] { VI_Tactus_SetFrame(frame.data(), 4, 6, -2); });
     EXPECT_EQ(check.expression, "(i) >= (0)");
     EXPECT_EQ(check.tail, "-2 < 0");
-
     // one image name, so index 1 is out
     check = catchCheck([&] { VI_Tactus_SetFrame(frame.data(), 4, 6, 1); });
     EXPECT_TRUE(check.thrown);
     EXPECT_EQ(check.expression, "(i) < ((int)ViInterfaceSingleton::get()->getEngineInfo().imageNames.size())");
     EXPECT_EQ(check.tail, "1 >= 1");
-
     // sizes from outside that make no picture end in a check, not a crash
-    check = catchCheck([&] { VI_Tactus_SetFrame(frame.data(), -4, 6, 0); });
-    EXPECT_TRUE(check.thrown);
+    EXPECT_TRUE(catchCheck([&] { VI_Tactus_SetFrame(frame.data(), -4, 6, 0); }).thrown);
     check = catchCheck([&] { VI_Tactus_SetFrame(frame.data(), 1, 6, 0); });
     EXPECT_TRUE(check.thrown);
     EXPECT_EQ(check.expression, "rect.area()");
     viFrameParameters.reset();
 }
 
-TEST(CInterface, InitReadsThePublishedSettings) {
+// Init reads the published settings; the rest goes to the one engine.
+TEST(CInterface, InitAndForwardsToTheOneEngine) {
     TestEngine& engine = testEngine();
     zoomTwice = false;
     swapRedBlue = true;
@@ -217,17 +211,12 @@ TEST(CInterface, InitReadsThePublishedSettings) {
     engine.info().parameters = {{"zoom-twice", "yes"}};
     EXPECT_TRUE(catchCheck([] { VI_Tactus_Init(); }).thrown);
     engine.info().parameters = {{"zoom-twice", "1"}};
-}
 
-TEST(CInterface, ForwardsToTheOneEngine) {
-    TestEngine& engine = testEngine();
     LQ::ViInterface* before = ViInterfaceSingleton::get().get();
 
     engine.parameters.clear();
     VI_Tactus_SetParameter("mode", "fist");
-    ASSERT_EQ(engine.parameters.size(), 1u);
-    EXPECT_EQ(engine.parameters[0].first, "mode");
-    EXPECT_EQ(engine.parameters[0].second, "fist");
+    EXPECT_EQ(engine.parameters, (std::vector<std::pair<std::string, std::string>>{{"mode", "fist"}}));
 
     const int resets = engine.resets, releases = engine.releases;
     VI_Tactus_Reset();
@@ -275,15 +264,13 @@ TEST(CInterface, DebugImagesAreReadFromTheProcessList) {
 
 TEST(ViInterface, ParseImageNameTakesTheFirstWordAtTheStart) {
     using LQ::ViInterface;
-    EXPECT_EQ(ViInterface::parseImageName("mono16"), LQ::COLOR_MODE_MONO16);
-    EXPECT_EQ(ViInterface::parseImageName("mono16_left"), LQ::COLOR_MODE_MONO16);
-    EXPECT_EQ(ViInterface::parseImageName("monochrome"), LQ::COLOR_MODE_MONO);
-    EXPECT_EQ(ViInterface::parseImageName("bgr_camera"), LQ::COLOR_MODE_BGR);
-    EXPECT_EQ(ViInterface::parseImageName("rgba"), LQ::COLOR_MODE_RGBA);
-    EXPECT_EQ(ViInterface::parseImageName("rgb"), LQ::COLOR_MODE_RGB);
-    EXPECT_EQ(ViInterface::parseImageName("float2"), LQ::COLOR_MODE_FLOAT2);
-    EXPECT_EQ(ViInterface::parseImageName("float"), LQ::COLOR_MODE_FLOAT);
-    EXPECT_EQ(ViInterface::parseImageName("yuv"), LQ::COLOR_MODE_YUV);
+    const std::pair<const char*, LQ::ColorMode> names[] = {
+        {"mono16", LQ::COLOR_MODE_MONO16}, {"mono16_left", LQ::COLOR_MODE_MONO16},
+        {"monochrome", LQ::COLOR_MODE_MONO}, {"bgr_camera", LQ::COLOR_MODE_BGR},
+        {"rgba", LQ::COLOR_MODE_RGBA},       {"rgb", LQ::COLOR_MODE_RGB},
+        {"float2", LQ::COLOR_MODE_FLOAT2},   {"float", LQ::COLOR_MODE_FLOAT},
+        {"yuv", LQ::COLOR_MODE_YUV}};
+    for (const auto& [name, mode] : names) EXPECT_EQ(ViInterface::parseImageName(name), mode) << name;
 
     for (const char* bad : {"xbgr", "", "mon", "BGR"}) {
         const FailedCheck check = catchCheck([&] { ViInterface::parseImageName(bad); });

@@ -28,8 +28,7 @@ using glyphs::Pose;
 CascadedClassifier fCascade(glyphs::Tables& tables) { return glyphs::cascade(glyphs::kF, tables, "F"); }
 void drawF(Image& image, int ox, int oy, float s, Pose pose) { glyphs::draw(glyphs::kF, image, ox, oy, s, pose); }
 
-// A detector that counts its calls and may refuse: it resets the location of the hits
-// whose call numbers it is given.
+// Counts its calls and resets the location on the listed call numbers.
 class Scripted : public LQ::BaseDetector {
 public:
     explicit Scripted(std::vector<int> refuse = {}) : refuse_(std::move(refuse)) {}
@@ -50,9 +49,8 @@ AdaObject hit(int x, int score) {
 
 }  // namespace
 
-// Four Fs in four poses and three sizes: the detector with the eight variants of a ring
-// reports exactly four objects, each with its centre, size, angle and hand. The base
-// cascade is labelled 30 degrees, so the variants carry the ring's derived angles.
+// Four Fs in four poses and sizes give exactly four objects with their centre, size, angle
+// and hand; the base cascade is labelled 30 degrees, so variants carry derived angles.
 TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
     glyphs::Tables tables;
     CascadedClassifier base = fCascade(tables);
@@ -85,11 +83,9 @@ TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
                               SharedPtr<LQ::BaseDetector>(), SharedPtr<LQ::BaseDetector>(),
                               SharedPtr<LQ::BaseDetector>(), LQ::RelativeLocation(1, BasePoint<float>(0, 0), 0, 0, 0),
                               1000);
-    EXPECT_EQ(detector.name(), "F");
     SharedPtr<StateAggregator> state = StateAggregator::newDetectorState();
     detector.detect(state);
 
-    // feature images cover what the cascades touch and no more than the image
     EXPECT_GT(detector.maxZoom(), 5.f);
     const std::vector<SharedPtr<StateAggregator>>& found = state->get<LQ::MultiState>();
     ASSERT_EQ(found.size(), 4u);
@@ -113,10 +109,9 @@ TEST(AdaBoostDetector, FindsEachPoseAtItsPlaceAngleSideAndSize) {
         }
         EXPECT_EQ(matches, 1) << "F at " << e.ox << ", " << e.oy;
     }
-    // the frame's own object stays unset with this store target
+    // with this store target the frame's own object stays unset
     EXPECT_FALSE(static_cast<const AdaObject&>(state->get<AdaObjectState>()).isSet());
-    // children point back at the frame's aggregator: the frame's reset ends the cycle
-    state->reset();
+    state->reset();  // children point back at the frame: the reset ends the cycle
 }
 
 TEST(AdaBoostDetector, ZoomsFollowTheWidthRange) {

@@ -5,6 +5,7 @@
 #include <atomic>
 #include <cstdlib>
 #include <new>
+#include <random>
 #include <vector>
 
 #include "CascadedClassifier.h"
@@ -13,14 +14,12 @@
 #include "LogCapture.h"
 #include "TestImages.h"
 
-#include <random>
-
 using LQ::BasePoint;
 using LQ::BaseRect;
 using LQ::BaseSize;
 using LQ::Image;
 
-// Every allocation of this test program is counted, so that a scan can show it makes none.
+// Counts every allocation, so a scan can show it makes none.
 namespace {
 std::atomic<long> allocations{0};
 }
@@ -29,7 +28,6 @@ void* operator new(std::size_t size) {
     if (void* p = std::malloc(size ? size : 1)) return p;
     throw std::bad_alloc();
 }
-// the replacement new takes its memory from malloc, so free is the matching release
 #pragma GCC diagnostic ignored "-Wmismatched-new-delete"
 void operator delete(void* p) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t) noexcept { std::free(p); }
@@ -58,26 +56,55 @@ struct Features {
     }
 };
 
-// One stage of one RMCT classifier at point (3, 2) of a 9 x 7 window.
-CascadedClassifier singlePointCascade(std::vector<LQ::schar>& table) {
-    WeakClassifierRmct weak(BasePoint<int>(3, 2));
+WeakClassifierRmct rmctAt(int x, int y, std::vector<LQ::schar>& table) {
+    WeakClassifierRmct weak(BasePoint<int>(x, y));
     weak.setData(table.data());
+    return weak;
+}
+WeakClassifierHaar haarOf(const BaseRect<int>& all, const BaseRect<int>& inner, std::vector<LQ::schar>& table) {
+    WeakClassifierHaar weak;
+    weak.set(all, inner);
+    weak.setData(table.data());
+    return weak;
+}
+WeakClassifierHog hogOf(const BaseRect<int>& block, const BaseRect<int>& cell, int sector,
+                        std::vector<LQ::schar>& table) {
+    WeakClassifierHog weak;
+    weak.setBlock(block);
+    weak.setCell(cell);
+    weak.setSector(sector);
+    weak.setData(table.data());
+    return weak;
+}
+void add(StrongClassifier& stage, const WeakClassifierRmct& weak) { stage.addRmctClassifier(weak); }
+void add(StrongClassifier& stage, const WeakClassifierHaar& weak) { stage.addHaarClassifier(weak); }
+void add(StrongClassifier& stage, const WeakClassifierHog& weak) { stage.addHogClassifier(weak); }
+
+template <class... Weak>
+StrongClassifier stageOf(int threshold, const Weak&... weak) {
     StrongClassifier stage;
-    stage.addRmctClassifier(weak);
-    stage.setThreshold(1);
+    (add(stage, weak), ...);
+    stage.setThreshold(threshold);
+    return stage;
+}
+
+CascadedClassifier cascadeOf(int width, int height, const char* name, const std::vector<StrongClassifier>& stages) {
     CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(9, 7));
-    cascade.setName("dot");
-    cascade.setAngle(0);
-    cascade.addStrongClassifier(stage);
+    cascade.setMonoSize(BaseSize<int>(width, height));
+    cascade.setName(name);
+    for (const StrongClassifier& stage : stages) cascade.addStrongClassifier(stage);
     return cascade;
+}
+
+// One census test at (3, 2) of a 9 x 7 window.
+CascadedClassifier singlePointCascade(std::vector<LQ::schar>& table) {
+    return cascadeOf(9, 7, "dot", {stageOf(1, rmctAt(3, 2, table))});
 }
 
 }  // namespace
 
-// A single bright pixel gives its upper-left neighbour exactly the code of "bright at
-// (+1, +1)". A classifier on that code must fire at exactly one window, and its turned and
-// mirrored copies at the neighbour in the turned and mirrored direction.
+// A bright pixel gives its upper-left neighbour one census code: a classifier on it fires at
+// one window, its turned and mirrored copies at the turned and mirrored neighbour.
 TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
     Image mono = flat(40, 30, 100);
     mono.pixel(20, 15)[0] = 250;
@@ -88,8 +115,6 @@ TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
 
     std::vector<LQ::schar> table = oneCode(code);
     CascadedClassifier cascade = singlePointCascade(table);
-    EXPECT_EQ(cascade.getBaseSize(), BaseSize<int>(9, 7));
-    EXPECT_EQ(cascade.getObjectCenter(), BasePoint<int>(4, 3));
 
     std::vector<AdaObject> objects;
     cascade.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
@@ -101,7 +126,7 @@ TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
     EXPECT_EQ(objects[0].weight, 1);
     EXPECT_STREQ(objects[0].name, "dot");
 
-    // step 2 visits only even positions from the first one: x = 16 is reached, y = 12 too
+    // step 2 reaches (16, 12) from the origin, not from x = 1
     objects.clear();
     cascade.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 2);
     EXPECT_EQ(objects.size(), 1u);
@@ -109,9 +134,7 @@ TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
     cascade.addMatches(f.rmct, mono, f.integral, objects, BaseRect<int>(1, 0, 40, 30), 1.0f, 2);
     EXPECT_TRUE(objects.empty());
 
-    // turned: the window is 7 x 9 and the dot's neighbour turns with it
-    std::vector<LQ::schar> table2 = oneCode(code);
-    CascadedClassifier turned = singlePointCascade(table2);
+    CascadedClassifier turned = singlePointCascade(table);
     turned.rotate();
     EXPECT_EQ(turned.getAngle(), 90);
     EXPECT_EQ(turned.getMonoSize(), BaseSize<int>(7, 9));
@@ -119,10 +142,9 @@ TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
     turned.addMatches(f.rmct, mono, f.integral, objects, 1.0f, 1);
     ASSERT_EQ(objects.size(), 1u);
     EXPECT_EQ(objects[0].angle, 90);
-    // every variant puts its object centre on the dot
     EXPECT_EQ(objects[0].center, BasePoint<int>(20, 15));
 
-    CascadedClassifier mirrored = singlePointCascade(table2);
+    CascadedClassifier mirrored = singlePointCascade(table);
     mirrored.flipVertically();
     EXPECT_EQ(mirrored.getSide(), LQ::Side::LEFT);
     objects.clear();
@@ -133,8 +155,7 @@ TEST(CascadeScan, SingleCodeFiresAtItsWindowOnly) {
     EXPECT_EQ(objects[0].center, BasePoint<int>(21 - 5 + 4, 14 - 2 + 3));
 }
 
-// The windows may reach the layer's edge but not beyond; a layer smaller than the window
-// yields nothing and activates nothing.
+// Windows reach the layer's edge, not beyond; a layer smaller than the window activates nothing.
 TEST(CascadeScan, WindowsStayInsideTheLayer) {
     std::vector<LQ::schar> all(256, 1);
     CascadedClassifier cascade = singlePointCascade(all);
@@ -161,17 +182,15 @@ TEST(CascadeScan, WindowsStayInsideTheLayer) {
     EXPECT_EQ(objects.size(), 1u);
 }
 
-// Haar rectangles grow with the zoom against the full-resolution integral image; two
-// zooms of one bucket share rectangles and shift entries; the first stage of one Haar
-// classifier takes the threshold-range path and reports score 0.
+// Haar rectangles grow with the zoom against the base integral; zooms of one bucket share
+// tables; a lone first Haar stage takes the threshold-range path and reports score 0.
 TEST(CascadeScan, HaarAtZoomAndTheRangePath) {
-    // a bright 12 x 12 square at (30, 24) in the base image
     Image base = flat(80, 60, 20);
     for (int y = 24; y < 36; ++y)
         for (int x = 30; x < 42; ++x) base.pixel(x, y)[0] = 220;
     Image integral;
     LQ::computeIntegral(base, integral);
-    // a layer at zoom 1.2 only needs the right size here: Haar reads the integral
+    // Haar reads the integral: the layer only needs its size
     Image layer = flat(66, 50, 0);
     Image rmct;
     LQ::computeRmct(layer, rmct);
@@ -179,16 +198,8 @@ TEST(CascadeScan, HaarAtZoomAndTheRangePath) {
     // the mean of the 10 x 10 middle of a 20 x 20 window at zoom 1: at least 190
     std::vector<LQ::schar> bright(256, -1);
     for (int i = 127 + 95; i < 256; ++i) bright[i] = 1;
-    WeakClassifierHaar haar;
-    haar.set(BaseRect<int>(5, 5, 15, 15), BaseRect<int>());
-    haar.setData(bright.data());
-    StrongClassifier stage;
-    stage.addHaarClassifier(haar);
-    stage.setThreshold(1);
-    CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(20, 20));
-    cascade.setName("square");
-    cascade.addStrongClassifier(stage);
+    const StrongClassifier stage = stageOf(1, haarOf(BaseRect<int>(5, 5, 15, 15), BaseRect<int>(), bright));
+    CascadedClassifier cascade = cascadeOf(20, 20, "square", {stage});
 
     std::vector<AdaObject> objects;
     cascade.addMatches(rmct, layer, integral, objects, 1.2f, 1);
@@ -208,16 +219,7 @@ TEST(CascadeScan, HaarAtZoomAndTheRangePath) {
 
     // the same stage behind an always-passing RMCT stage takes the table path and agrees
     std::vector<LQ::schar> all(256, 1);
-    WeakClassifierRmct any(BasePoint<int>(10, 10));
-    any.setData(all.data());
-    StrongClassifier first;
-    first.addRmctClassifier(any);
-    first.setThreshold(1);
-    CascadedClassifier twoStages;
-    twoStages.setMonoSize(BaseSize<int>(20, 20));
-    twoStages.setName("square");
-    twoStages.addStrongClassifier(first);
-    twoStages.addStrongClassifier(stage);
+    CascadedClassifier twoStages = cascadeOf(20, 20, "square", {stageOf(1, rmctAt(10, 10, all)), stage});
     std::vector<AdaObject> table;
     twoStages.addMatches(rmct, layer, integral, table, 1.2f, 1);
     ASSERT_EQ(table.size(), objects.size());
@@ -236,8 +238,8 @@ TEST(CascadeScan, HaarAtZoomAndTheRangePath) {
     EXPECT_NE(log.text().find(" not compatible with integral image "), std::string::npos);
 }
 
-// Stage order: a window that fails before the first HOG stage computes no HOG; the score
-// that equals a threshold passes; the scan allocates nothing once its tables exist.
+// No HOG for windows that fail earlier; a sum equal to the threshold passes; a steady scan
+// allocates nothing.
 TEST(CascadeScan, HogOnlyWhenReachedAndNoAllocation) {
     Image mono = flat(60, 50, 90);
     for (int y = 10; y < 30; ++y)
@@ -245,29 +247,11 @@ TEST(CascadeScan, HogOnlyWhenReachedAndNoAllocation) {
     Features f(mono);
 
     std::vector<LQ::schar> one(256, 1), none(256, -1), all(256, 2);
+    // the first stage's sum equals its threshold
     auto makeCascade = [&](bool secondPasses) {
-        CascadedClassifier cascade;
-        cascade.setMonoSize(BaseSize<int>(16, 16));
-        cascade.setName("hog");
-        WeakClassifierRmct r0(BasePoint<int>(2, 2)), r1(BasePoint<int>(9, 9));
-        r0.setData(one.data());
-        r1.setData(secondPasses ? one.data() : none.data());
-        StrongClassifier s0, s1, s2;
-        s0.addRmctClassifier(r0);
-        s0.setThreshold(1);  // equal to the sum: passes
-        s1.addRmctClassifier(r1);
-        s1.setThreshold(1);
-        WeakClassifierHog hog;
-        hog.setBlock(BaseRect<int>(2, 2, 14, 14));
-        hog.setCell(BaseRect<int>(4, 4, 8, 8));
-        hog.setSector(2);
-        hog.setData(all.data());
-        s2.addHogClassifier(hog);
-        s2.setThreshold(2);
-        cascade.addStrongClassifier(s0);
-        cascade.addStrongClassifier(s1);
-        cascade.addStrongClassifier(s2);
-        return cascade;
+        return cascadeOf(16, 16, "hog",
+                         {stageOf(1, rmctAt(2, 2, one)), stageOf(1, rmctAt(9, 9, secondPasses ? one : none)),
+                          stageOf(2, hogOf(BaseRect<int>(2, 2, 14, 14), BaseRect<int>(4, 4, 8, 8), 2, all))});
     };
 
     CascadedClassifier failing = makeCascade(false);
@@ -294,32 +278,17 @@ TEST(CascadeScan, HogOnlyWhenReachedAndNoAllocation) {
     EXPECT_EQ(objects.size(), windows);
 }
 
-// A whole cascade, properties and stages, comes back after four turns and after two
-// mirrors; one turn of a 40 x 35 window with an off-centre object moves the object too.
+// A cascade comes back after four turns and two mirrors; a turn moves an off-centre object.
 TEST(CascadeScan, CascadeTurnsAndMirrorsComeBack) {
     std::vector<LQ::schar> table(256);
     for (int i = 0; i < 256; ++i) table[i] = static_cast<LQ::schar>(i * 7 % 23 - 11);
-    CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(40, 35));
+    CascadedClassifier cascade = cascadeOf(
+        40, 35, "fist",
+        {stageOf(0, rmctAt(5, 9, table), haarOf(BaseRect<int>(2, 3, 30, 20), BaseRect<int>(4, 5, 10, 12), table),
+                 hogOf(BaseRect<int>(3, 3, 20, 30), BaseRect<int>(5, 6, 9, 12), 5, table))});
     cascade.setBaseSize(BaseSize<int>(26, 26));
     cascade.setObjectCenter(BasePoint<int>(20, 18));
-    cascade.setName("fist");
     cascade.setAngle(-30);
-    StrongClassifier stage;
-    WeakClassifierRmct rmct(BasePoint<int>(5, 9));
-    rmct.setData(table.data());
-    stage.addRmctClassifier(rmct);
-    WeakClassifierHaar haar;
-    haar.set(BaseRect<int>(2, 3, 30, 20), BaseRect<int>(4, 5, 10, 12));
-    haar.setData(table.data());
-    stage.addHaarClassifier(haar);
-    WeakClassifierHog hog;
-    hog.setBlock(BaseRect<int>(3, 3, 20, 30));
-    hog.setCell(BaseRect<int>(5, 6, 9, 12));
-    hog.setSector(5);
-    hog.setData(table.data());
-    stage.addHogClassifier(hog);
-    cascade.addStrongClassifier(stage);
     EXPECT_EQ(cascade.getObjectRect(), BaseRect<int>(7, 5, 33, 31));
 
     CascadedClassifier turned = cascade;
@@ -348,9 +317,8 @@ TEST(CascadeScan, CascadeTurnsAndMirrorsComeBack) {
 
 namespace {
 
-// One window's stage sums from the classifiers' own rectangles and points: census bytes,
-// rectangle sums of the integral image with an integer division, and HOG sums of the whole
-// layer's integral HOG. Nothing of the scan's packed forms, lists or vector kernels.
+// One window's stage sum straight from the classifiers' definitions, none of the scan's
+// packed forms or vector kernels.
 struct Reference {
     const Image& rmct;
     const Image& integral;
@@ -403,53 +371,39 @@ BaseRect<int> randomRect(std::mt19937& random, const BaseRect<int>& inside, int 
 CascadedClassifier randomCascade(std::mt19937& random, const std::vector<std::array<int, 3>>& kinds,
                                  std::vector<std::vector<LQ::schar>>& tables) {
     const int W = 13 + random() % 9, H = 12 + random() % 9;
-    CascadedClassifier cascade;
-    cascade.setMonoSize(BaseSize<int>(W, H));
-    cascade.setName("random");
-    const auto table = [&]() {
+    std::vector<StrongClassifier> stages;
+    const auto table = [&]() -> std::vector<LQ::schar>& {
         tables.emplace_back(256);
         for (auto& v : tables.back()) v = static_cast<LQ::schar>(static_cast<int>(random() % 41) - 20);
-        return tables.back().data();
+        return tables.back();
     };
     for (const auto& kind : kinds) {
-        StrongClassifier stage;
+        StrongClassifier& stage = stages.emplace_back();
         for (int k = 0; k < kind[0]; ++k) {
-            WeakClassifierRmct weak(BasePoint<int>(random() % W, random() % H));
-            weak.setData(table());
-            stage.addRmctClassifier(weak);
+            const BasePoint<int> point(random() % W, random() % H);
+            add(stage, rmctAt(point.x, point.y, table()));
         }
         for (int k = 0; k < kind[1]; ++k) {
-            WeakClassifierHaar weak;
             const BaseRect<int> all = randomRect(random, BaseRect<int>(0, 0, W, H), 2);
-            weak.set(all, random() % 5 ? randomRect(random, all, 1) : BaseRect<int>());
-            weak.setData(table());
-            stage.addHaarClassifier(weak);
+            const BaseRect<int> inner = random() % 5 ? randomRect(random, all, 1) : BaseRect<int>();
+            add(stage, haarOf(all, inner, table()));
         }
         for (int k = 0; k < kind[2]; ++k) {
             // blocks one pixel inside the window, as the HOG region needs
-            WeakClassifierHog weak;
             const BaseRect<int> block = randomRect(random, BaseRect<int>(1, 1, W - 1, H - 1), 3);
-            weak.setBlock(block);
-            weak.setCell(randomRect(random, block, 1));
-            weak.setSector(random() % 6);
-            weak.setData(table());
-            stage.addHogClassifier(weak);
+            const BaseRect<int> cell = randomRect(random, block, 1);
+            const int sector = random() % 6;
+            add(stage, hogOf(block, cell, sector, table()));
         }
-        cascade.addStrongClassifier(stage);
     }
-    return cascade;
+    return cascadeOf(W, H, "random", stages);
 }
 
 }  // namespace
 
-// The scan finds exactly the windows, in the same order and with the same scores, that a
-// window-by-window evaluation from the classifiers' definitions finds: census-only first
-// stages (the vector kernel) and mixed ones, census, Haar and HOG stages after them, one and
-// two HOG stages, steps 1 to 3, zooms 1 and 1.2, odd layer sizes with a wider stride, and the
-// HOG from the layer's shared image, made per window, or chosen by their costs. The census stages after the first go
-// in lists, densely for the row, or each way by the rows' shares; a stage of 300 tests is
-// beyond the dense kernel and ends its run of stages. Thresholds are set from the reference
-// sums so that some windows end at every stage and some pass them all.
+// The scan equals window-by-window evaluation (windows, order, scores) over random stage mixes,
+// steps 1-3, zooms 1 and 1.2, odd strides, every HOG source and dense/list census path; the
+// 300-test stage is beyond the dense kernel. Thresholds let some windows end at every stage.
 TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
     const std::vector<std::vector<std::array<int, 3>>> shapes = {
         {{5, 0, 0}, {12, 0, 0}, {6, 5, 0}, {8, 0, 6}, {0, 3, 4}},
@@ -477,7 +431,6 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                                     integral);
                 const Reference reference(rmct, mono, integral, zoom);
 
-                // thresholds: the first stage passes a third of the windows, each later half
                 const BaseSize<int> window = cascade.getMonoSize();
                 std::vector<BasePoint<int>> reached;
                 for (int y = 0; y + window.height <= layerH; y += step)
@@ -504,7 +457,6 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                 ASSERT_FALSE(expected.empty());
                 hits += static_cast<int>(expected.size());
 
-                // HOG per window, from the layer's image, or either by their costs
                 for (int hogWay : {0, 1, 2})
                 for (double denseShare : {2.0, 0.0, denseCensusShare()}) {
                     CascadedClassifier scanned = cascade;
@@ -518,13 +470,12 @@ TEST(CascadeScan, ScanEqualsWindowByWindowEvaluation) {
                     std::vector<AdaObject> objects;
                     scanned.addMatches(rmct, mono, integral, objects, zoom, step);
                     hogScans += hogWay == 1 && layerHog.computed;
-                    ASSERT_EQ(objects.size(), expected.size())
-                        << shape << " " << step << " " << zoom << " " << denseShare;
+                    SCOPED_TRACE(::testing::Message() << shape << " " << step << " " << zoom << " " << hogWay << " "
+                                                      << denseShare);
+                    ASSERT_EQ(objects.size(), expected.size());
                     for (size_t k = 0; k < objects.size(); ++k) {
-                        ASSERT_EQ(objects[k].center, expected[k].center)
-                            << shape << " " << step << " " << k << " " << denseShare;
-                        ASSERT_EQ(objects[k].score, expected[k].score)
-                            << shape << " " << step << " " << k << " " << denseShare;
+                        ASSERT_EQ(objects[k].center, expected[k].center) << k;
+                        ASSERT_EQ(objects[k].score, expected[k].score) << k;
                     }
                 }
             }

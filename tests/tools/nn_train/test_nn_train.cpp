@@ -40,6 +40,22 @@ Tensor spreadTensor(int n, int c, int h, int w, unsigned seed) {
     return t;
 }
 
+// each value of x moved by +-eps: the central difference of the loss against the gradient
+template <class Loss>
+void expectGradient(std::vector<float>& x, const std::vector<float>& gradient, Loss loss, double absolute,
+                    double relative) {
+    const float eps = 1e-2f;
+    for (size_t i = 0; i < x.size(); ++i) {
+        const float keep = x[i];
+        x[i] = keep + eps;
+        const double up = loss();
+        x[i] = keep - eps;
+        const double down = loss();
+        x[i] = keep;
+        EXPECT_NEAR((up - down) / (2 * eps), gradient[i], absolute + relative * std::fabs(gradient[i])) << i;
+    }
+}
+
 // L = sum of out * r; checks dL/din and dL/dparams of one layer
 void checkLayer(Layer& layer, Tensor input, unsigned seed) {
     SCOPED_TRACE(layer.name());
@@ -54,32 +70,10 @@ void checkLayer(Layer& layer, Tensor input, unsigned seed) {
         return sum;
     };
     for (Param* p : layer.params()) std::fill(p->grad.begin(), p->grad.end(), 0.0f);
-    layer.forward(input, out);
     Tensor din;
     layer.backward(input, out, r, &din);
-    const float eps = 1e-2f;
-    auto expectClose = [](double numeric, double analytic, const char* what, size_t i) {
-        EXPECT_NEAR(numeric, analytic, 2e-3 + 2e-3 * std::fabs(analytic)) << what << " " << i;
-    };
-    for (size_t i = 0; i < input.size(); ++i) {
-        const float keep = input.v[i];
-        input.v[i] = keep + eps;
-        const double up = loss();
-        input.v[i] = keep - eps;
-        const double down = loss();
-        input.v[i] = keep;
-        expectClose((up - down) / (2 * eps), din.v[i], "input", i);
-    }
-    for (Param* p : layer.params())
-        for (size_t i = 0; i < p->value.size(); ++i) {
-            const float keep = p->value[i];
-            p->value[i] = keep + eps;
-            const double up = loss();
-            p->value[i] = keep - eps;
-            const double down = loss();
-            p->value[i] = keep;
-            expectClose((up - down) / (2 * eps), p->grad[i], "param", i);
-        }
+    expectGradient(input.v, din.v, loss, 2e-3, 2e-3);
+    for (Param* p : layer.params()) expectGradient(p->value, p->grad, loss, 2e-3, 2e-3);
 }
 
 Blob toBlob(const Tensor& t, int i) {
@@ -120,18 +114,10 @@ TEST(NnTrain, BackwardPassesMatchFiniteDifferences) {
     Tensor scores = randomTensor(3, 2, 1, 1, 24);
     const std::vector<int> labels = {1, 0, 1};
     const std::vector<float> weights = {1, 2, 0.5f};
-    Tensor gradient;
+    Tensor gradient, unused;
     softmaxCrossEntropy(scores, labels, weights, gradient);
-    for (size_t i = 0; i < scores.size(); ++i) {
-        Tensor g;
-        const float keep = scores.v[i];
-        scores.v[i] = keep + 1e-2f;
-        const double up = softmaxCrossEntropy(scores, labels, weights, g);
-        scores.v[i] = keep - 1e-2f;
-        const double down = softmaxCrossEntropy(scores, labels, weights, g);
-        scores.v[i] = keep;
-        EXPECT_NEAR((up - down) / 2e-2, gradient.v[i], 1e-3) << i;
-    }
+    const auto loss = [&] { return softmaxCrossEntropy(scores, labels, weights, unused); };
+    expectGradient(scores.v, gradient.v, loss, 1e-3, 0);
 }
 
 TEST(NnTrain, ShapesFollowTheRuntimesRounding) {
@@ -272,21 +258,22 @@ TEST(NnTrain, MinedHitsAreLabelledAgainstTheTruth) {
     const std::vector<TruthHand> hands = {{Gesture::Fist, {100, 100, 180, 190}},
                                           {Gesture::Pointer, {300, 40, 380, 240}},
                                           {std::nullopt, {450, 100, 530, 200}}};
-    // on the fist, a little off and smaller: still its hand
-    EXPECT_EQ(labelHit({104, 110, 176, 186}, hands, Gesture::Fist), HitLabel::Positive);
-    // the curled lower part of the pointer hand, the fist ring's favourite mistake
-    EXPECT_EQ(labelHit({300, 150, 380, 240}, hands, Gesture::Fist), HitLabel::Negative);
-    // the background
-    EXPECT_EQ(labelHit({10, 10, 60, 60}, hands, Gesture::Fist), HitLabel::Negative);
-    // well off the fist (overlap 0.23): neither its hand nor clear of it
-    EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist), HitLabel::Dropped);
-    // what the evaluation counts as found (overlap 1/3) is positive
-    EXPECT_EQ(labelHit({140, 100, 220, 190}, hands, Gesture::Fist), HitLabel::Positive);
-    // a hand of unknown shape (changing, or mostly out of the frame) may be a fist
-    EXPECT_EQ(labelHit({450, 100, 530, 200}, hands, Gesture::Fist), HitLabel::Dropped);
-    // the same hits for the pointer: its own hand positive, the fist negative
-    EXPECT_EQ(labelHit({300, 40, 380, 240}, hands, Gesture::Pointer), HitLabel::Positive);
-    EXPECT_EQ(labelHit({104, 110, 176, 186}, hands, Gesture::Pointer), HitLabel::Negative);
+    const struct {
+        Rect hit;
+        Gesture gesture;
+        HitLabel label;
+        const char* why;
+    } cases[] = {
+        {{104, 110, 176, 186}, Gesture::Fist, HitLabel::Positive, "on the fist, a little off and smaller"},
+        {{300, 150, 380, 240}, Gesture::Fist, HitLabel::Negative, "the pointer hand's curled lower part"},
+        {{10, 10, 60, 60}, Gesture::Fist, HitLabel::Negative, "the background"},
+        {{150, 100, 230, 190}, Gesture::Fist, HitLabel::Dropped, "overlap 0.23: neither its hand nor clear"},
+        {{140, 100, 220, 190}, Gesture::Fist, HitLabel::Positive, "overlap 1/3, found for the evaluation"},
+        {{450, 100, 530, 200}, Gesture::Fist, HitLabel::Dropped, "a hand of unknown shape may be a fist"},
+        {{300, 40, 380, 240}, Gesture::Pointer, HitLabel::Positive, "the pointer's own hand"},
+        {{104, 110, 176, 186}, Gesture::Pointer, HitLabel::Negative, "the fist, for the pointer"},
+    };
+    for (const auto& c : cases) EXPECT_EQ(labelHit(c.hit, hands, c.gesture), c.label) << c.why;
     // the thresholds are the overlaps themselves
     EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist, 0.2f), HitLabel::Positive);
     EXPECT_EQ(labelHit({150, 100, 230, 190}, hands, Gesture::Fist, 0.4f, 0.3f), HitLabel::Negative);

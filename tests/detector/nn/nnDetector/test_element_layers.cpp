@@ -34,9 +34,7 @@ Blob counting(int n, int c, int h, int w) {
     return blob;
 }
 
-std::vector<float> values(const Blob& blob) {
-    return blob;
-}
+std::vector<float> values(const Blob& blob) { return blob; }
 
 LQ::SharedPtr<BaseLayer> input(const Blob& blob) {
     LQ::SharedPtr<BaseLayer> layer(new DataLayer("in"));
@@ -126,10 +124,8 @@ TEST(ElementLayers, ActivationsInPlaceOrOwn) {
     Blob tangens = makeBlob(1, 1, 1, 4, {0.f, 1.5f, -1.5f, 1000.f});
     TangensLayer tangensLayer("tanh");
     run(tangensLayer, tangens);
-    EXPECT_EQ(tangens.data()[0], 0.f);
-    EXPECT_NEAR(tangens.data()[1], 1.3273852f, 1e-5);
-    EXPECT_NEAR(tangens.data()[2], -1.3273852f, 1e-5);
-    EXPECT_NEAR(tangens.data()[3], 1.7159f, 1e-5);
+    const float tanhs[4] = {0.f, 1.3273852f, -1.3273852f, 1.7159f};
+    for (int i = 0; i < 4; ++i) EXPECT_NEAR(tangens.data()[i], tanhs[i], 1e-5) << i;
 
     Blob linear = makeBlob(1, 3, 1, 1, {1.f, 2.f, 4.f});
     LinearTransformLayer linearLayer("linear");
@@ -262,10 +258,9 @@ TEST(ElementLayers, SerializeRoundTrips) {
     const std::string old = written(segments, "Version 2");
     EXPECT_EQ(old.size(), 12u);
     readInto(oldSlice, old, "Version 2");
-    EXPECT_EQ(oldSlice.getSegmentNumber(), 2);
-    EXPECT_EQ(oldSlice.getNumSegments(), 4);
-    EXPECT_EQ(oldSlice.getSlicePoint(), 0);
-    EXPECT_EQ(oldSlice.getSliceSize(), 0);
+    EXPECT_EQ((std::vector<int>{oldSlice.getSegmentNumber(), oldSlice.getNumSegments(),
+                                oldSlice.getSlicePoint(), oldSlice.getSliceSize()}),
+              (std::vector<int>{2, 4, 0, 0}));
 
     // before "Version 6" vector counts are decimal text ahead of the raw floats
     const float a[2] = {1.5f, -2.f}, b[2] = {0.f, 3.f};
@@ -317,11 +312,8 @@ TEST(ElementLayers, CompareAndClone) {
     std::vector<LQ::SharedPtr<BaseLayer>> layers{new SoftmaxLayer("x", 0.3f), new PoolingLayer(3, 1, "p"),
                                                  new ConcatLayer("c", false), new FlattenLayer("f", true),
                                                  new ReshapeLayer("h", LQ::BaseSize<int>(2, 3))};
-    for (const LQ::SharedPtr<BaseLayer>& layer : layers) {
-        const LQ::SharedPtr<BaseLayer> twin = layer->clone();
-        EXPECT_EQ(twin->type(), layer->type());
-        EXPECT_TRUE(*twin == *layer) << layer->type();
-    }
+    for (const LQ::SharedPtr<BaseLayer>& layer : layers)
+        EXPECT_TRUE(*layer->clone() == *layer) << layer->type();
     EXPECT_TRUE(dynamic_cast<FlattenLayer&>(*layers[3]->clone()).isInterleave());
 }
 
@@ -363,12 +355,9 @@ TEST(ShapeLayers, MaxPooling) {
     PoolingLayer two(2, 2, "pool");
     run(two, twoPlanes(2));
     EXPECT_EQ(two.getBlob().shape(), "2 x 2 x 3 x 3");
-    const std::vector<float> expected2 = {9, 8, 6, 5, 9, 3, 7, 6, 8};
-    for (int i = 0; i < 9; ++i) {
-        EXPECT_EQ(two.getBlob().data()[i], expected2[i]) << i;
-        EXPECT_EQ(two.getBlob().data()[9 + i], expected2[i] - 20) << i;
-        EXPECT_EQ(two.getBlob().data()[27 + i], expected2[i] - 20) << "second sample " << i;
-    }
+    const float expected2[9] = {9, 8, 6, 5, 9, 3, 7, 6, 8};
+    for (int i = 0; i < 36; ++i)  // the second channel of each sample is 20 lower
+        EXPECT_EQ(two.getBlob().data()[i], expected2[i % 9] - (i % 18 < 9 ? 0 : 20)) << i;
     const float* memory = two.getBlob().data();
     two.forward();
     EXPECT_EQ(two.getBlob().data(), memory) << "the output keeps its memory";
@@ -396,14 +385,11 @@ TEST(ShapeLayers, MaxPooling) {
     // the 2 x 2 kernel on its own: odd width and odd height
     const float src[6] = {1, 5, 2,  //
                           4, 3, 6};
-    float dst[2] = {};
-    maxPool<float>(src, dst, 3, 2);
-    EXPECT_EQ(dst[0], 5);
-    EXPECT_EQ(dst[1], 6);
-    dst[0] = dst[1] = 0;
-    maxPool<float>(src, dst, 2, 3);  // the same floats as 3 rows of 2: the last row alone
-    EXPECT_EQ(dst[0], 5);
-    EXPECT_EQ(dst[1], 6);
+    for (int width : {3, 2}) {  // 2 x 3 as 3 rows of 2: the last row pools alone
+        std::vector<float> dst(2, 0.f);
+        maxPool<float>(src, dst.data(), width, 6 / width);
+        EXPECT_EQ(dst, (std::vector<float>{5, 6})) << width;
+    }
 }
 
 // Concatenation copies whole bottoms one after the other, along channels of a single

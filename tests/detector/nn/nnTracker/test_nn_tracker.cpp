@@ -106,7 +106,6 @@ TEST(NnTracker, VerifierAndStates) {
     SharedPtr<StateAggregator> passes = scene.step(NnTracker::Type::VERIFIER, constant({{0, odds9}}), LQ::Side::RIGHT, 0.85f);
     EXPECT_TRUE(verifiedOf(passes));
     // a refusal unsets the object, so the detector that asked drops it; a pass keeps it
-    auto locationOf = [](SharedPtr<StateAggregator>& o) -> const LQ::ObjectLocation& { return o->get<LQ::LocationState>(); };
     EXPECT_FALSE(locationOf(strict).isSet());
     EXPECT_TRUE(locationOf(passes).isSet());
     SharedPtr<StateAggregator> single = scene.step(NnTracker::Type::VERIFIER, constant({{0.7f}}));
